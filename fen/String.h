@@ -62,8 +62,8 @@ public:
     BasicString(const CharT* text, std::size_t length) { Build(text, text == nullptr ? 0 : length); }
     BasicString(std::size_t count, CharT character)
     {
-        Build(nullptr, 0);
-        append(count, character);
+        Build(nullptr, count);
+        std::fill(begin_, end_, character);
     }
     /// The characters [from, from + count) of `other`; count is clipped to the end.
     BasicString(const BasicString& other, std::size_t from, std::size_t count)
@@ -304,12 +304,13 @@ private:
         return std::less_equal<const CharT*>()(begin_, p) && std::less_equal<const CharT*>()(p, capacityEnd_);
     }
 
-    /// Allocates a new buffer of exactly length + 1 characters holding `text`.
+    /// Allocates a new buffer of exactly length + 1 characters holding
+    /// `text`, or left for the caller to fill when `text` is null.
     void Build(const CharT* text, std::size_t length)
     {
         SafeInteger n = SafeInteger::FromSize(length);
         begin_ = static_cast<CharT*>(CheckedAlloc(BytesFor(n + 1)));
-        if (length != 0)
+        if (text != nullptr && length != 0)
             std::memcpy(begin_, text, length * sizeof(CharT));
         end_ = begin_ + length;
         capacityEnd_ = end_;
