@@ -4,6 +4,7 @@
 /// (bits 16-19 of a Numeric value's type word).
 
 #include <cstdint>
+#include <string_view>
 
 namespace qv::value {
 
@@ -50,5 +51,7 @@ enum class NumericKind : std::uint16_t {
 
 /// Resource id of the type name of `code` (low 16 bits of a type word).
 std::uint32_t TypeNameId(std::uint32_t code) noexcept;
+/// The type name of `code` from the string table ("Numeric", "Undefined", ...).
+std::string_view TypeName(std::uint32_t code) noexcept;
 
 } // namespace qv::value

@@ -1,5 +1,7 @@
 #include "value/TypeCodes.h"
 
+#include "resources/StringTable.h"
+
 namespace qv::value {
 
 std::uint32_t TypeNameId(std::uint32_t code) noexcept
@@ -17,6 +19,11 @@ std::uint32_t TypeNameId(std::uint32_t code) noexcept
     case TypeCode::Vector: return 603;
     default: return 61290; // "Undefined"
     }
+}
+
+std::string_view TypeName(std::uint32_t code) noexcept
+{
+    return qv::resources::FindString(TypeNameId(code)).value_or(std::string_view());
 }
 
 } // namespace qv::value

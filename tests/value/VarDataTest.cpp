@@ -24,6 +24,9 @@ TEST(VarData, DefaultAndEmptyTextValuesHoldNoStorage)
     VarData empty;
     EXPECT_EQ(empty.Code(), TypeCode::Empty);
     EXPECT_EQ(TypeNameId(empty.TypeWord()), 61290u);
+    EXPECT_EQ(TypeName(empty.TypeWord()), "Undefined");
+    EXPECT_EQ(TypeName(VarData::MakeNumeric(1, 8).TypeWord()), "Numeric"); // low 16 bits only
+    EXPECT_EQ(TypeName(TypeCode::UInt64), "Undefined");
     EXPECT_EQ(empty.ToDouble(), 0.0);
 
     VarData text("");
