@@ -183,8 +183,11 @@ public:
         if (text == begin_ && length == this->length())
             return;
         if (Owns(text)) {
-            // A part of our own text: move it to the front before any reallocation.
-            if (static_cast<std::size_t>(end_ - text) < length)
+            // A part of our own text: move it to the front before any
+            // reallocation. Only the characters before the end may be taken;
+            // the spare capacity behind it holds nothing.
+            const std::size_t available = text <= end_ ? static_cast<std::size_t>(end_ - text) : 0;
+            if (available < length)
                 QV_THROW(exception::OutOfRange());
             std::memmove(begin_, text, length * sizeof(CharT));
             end_ = begin_ + length;
@@ -347,9 +350,10 @@ private:
         capacityEnd_ = begin_ + capacity.Value();
     }
 
+    /// Appends [text, text + count); a null text appends nothing.
     BasicString& AppendRange(const CharT* text, std::size_t count)
     {
-        if (count == 0)
+        if (count == 0 || text == nullptr)
             return *this;
         // The text may be part of our own buffer, which growing can move.
         const bool own = Owns(text);

@@ -15,6 +15,9 @@ namespace qv::fen {
 
 template <typename T>
 class Vector {
+    // The task allocator aligns its blocks for the fundamental types only.
+    static_assert(alignof(T) <= alignof(std::max_align_t));
+
 public:
     Vector() noexcept = default;
     Vector(const Vector& other) { CopyFrom(other); }

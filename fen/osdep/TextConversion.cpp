@@ -90,8 +90,10 @@ void RunConversion(iconv_t cd, const char* input, std::size_t inputBytes, std::s
             inLeft -= skip;
             continue;
         }
-        if (error != 0)
+        if (error != 0) {
+            errno = error; // the sink may have changed it since
             QV_THROW(WinError());
+        }
         if (inLeft == 0 && result != static_cast<std::size_t>(-1))
             return;
     }
@@ -174,7 +176,9 @@ std::size_t WideToAnsi(const char16_t* begin, const char16_t* end, char* out, st
     const std::string bytes = NarrowToStd(begin, end, CodePageFromName(codePageName));
     if (bytes.size() > capacity)
         QV_THROW(WinError(kInsufficientBuffer));
-    std::memcpy(out, bytes.data(), bytes.size());
+    // `out` may be null when the caller has no room and expects nothing.
+    if (!bytes.empty())
+        std::memcpy(out, bytes.data(), bytes.size());
     return bytes.size();
 }
 
@@ -184,7 +188,8 @@ std::size_t AnsiToWide(const char* begin, const char* end, char16_t* out, std::s
     const std::u16string wide = WidenToStd(begin, end, CodePageFromName(codePageName));
     if (wide.size() > capacity)
         QV_THROW(WinError(kInsufficientBuffer));
-    std::memcpy(out, wide.data(), wide.size() * 2);
+    if (!wide.empty())
+        std::memcpy(out, wide.data(), wide.size() * 2);
     return wide.size();
 }
 

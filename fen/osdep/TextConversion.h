@@ -4,10 +4,10 @@
 ///
 /// The library knows three code-page names, compared exactly: "" is the
 /// system code page (the current locale's charset), "US-ASCII" and "cp932";
-/// any other name throws InvalidLocale. As on the original platform, a
-/// character the target cannot represent becomes '?' in 8-bit text and
-/// U+FFFD in 16-bit text instead of failing the conversion. A failure of the
-/// converter itself throws WinError.
+/// any other name throws InvalidLocale. A character the target cannot
+/// represent becomes '?' in 8-bit text and U+FFFD in 16-bit text, so that
+/// text is never refused for its content. A failure of the converter itself
+/// throws WinError.
 
 #include "fen/String.h"
 

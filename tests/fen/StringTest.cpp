@@ -63,6 +63,17 @@ TEST(String, AssignFromItsOwnTextKeepsTheText)
 
     s = s; // self-assignment changes nothing
     EXPECT_STREQ(s.c_str(), "abc");
+
+    // Only characters before the end can be taken, not the spare room behind it.
+    String t("0123456789");
+    t.append("x");
+    ASSERT_GT(t.capacity(), t.length() + 2);
+    EXPECT_THROW(t.assign(t.c_str() + t.length() + 1, 2), OutOfRange);
+    EXPECT_THROW(t.assign(t.c_str() + 8, 4), OutOfRange);
+    EXPECT_STREQ(t.c_str(), "0123456789x");
+
+    t.append(static_cast<const char*>(nullptr), 3); // like assign, null is the empty text
+    EXPECT_STREQ(t.c_str(), "0123456789x");
 }
 
 TEST(String, AppendDoublesAndFallsBackToTheExactSize)

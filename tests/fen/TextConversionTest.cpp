@@ -82,4 +82,8 @@ TEST(TextConversion, CallerBuffersReportCountAndOverflow)
     char16_t back[3];
     EXPECT_EQ(AnsiToWide(out, out + 5, back, 3), 3u);
     EXPECT_EQ(std::u16string_view(back, 3), wide);
+
+    // No room and nothing to write: no buffer is needed.
+    EXPECT_EQ(WideToAnsi(wide.data(), wide.data(), nullptr, 0), 0u);
+    EXPECT_EQ(AnsiToWide(out, out, nullptr, 0), 0u);
 }
