@@ -1,6 +1,7 @@
 #include "fen/osdep/LocalePicture.h"
 
 #include "fen/osdep/TextConversion.h"
+#include "fen/osdep/UserLocalePictures.h"
 
 #include <langinfo.h>
 #include <mutex>
@@ -176,14 +177,14 @@ std::shared_ptr<const LocalePictureSource> GetLocalePictureSource()
 {
     std::lock_guard<std::mutex> guard(sourceLock);
     if (!currentSource)
-        currentSource = std::make_shared<PosixLocalePictureSource>();
+        currentSource = std::make_shared<UserLocalePictureSource>();
     return currentSource;
 }
 
 std::shared_ptr<const LocalePictureSource> SetLocalePictureSource(std::shared_ptr<const LocalePictureSource> source)
 {
     if (!source)
-        source = std::make_shared<PosixLocalePictureSource>();
+        source = std::make_shared<UserLocalePictureSource>();
     std::lock_guard<std::mutex> guard(sourceLock);
     currentSource.swap(source);
     return source;

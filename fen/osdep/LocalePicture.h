@@ -6,7 +6,8 @@
 /// A picture names each field by a run of one letter (d, M, y, h, H, m, s, t)
 /// and copies text between apostrophes literally. Where the pictures come
 /// from is one replaceable object, a LocalePictureSource: by default the
-/// POSIX locale of the process (its LC_TIME and LC_NUMERIC categories).
+/// user's own pictures in the registry store, and for those not set there
+/// the POSIX locale of the process (its LC_TIME and LC_NUMERIC categories).
 
 #include "fen/String.h"
 
@@ -42,7 +43,7 @@ public:
 /// The source in use.
 std::shared_ptr<const LocalePictureSource> GetLocalePictureSource();
 
-/// Makes `source` the source in use (null restores the POSIX source) and
+/// Makes `source` the source in use (null restores the default source) and
 /// returns the one it replaces.
 std::shared_ptr<const LocalePictureSource> SetLocalePictureSource(
     std::shared_ptr<const LocalePictureSource> source);

@@ -1,4 +1,5 @@
 #include "fen/osdep/LocalePicture.h"
+#include "fen/osdep/UserLocalePictures.h"
 
 #include <gtest/gtest.h>
 
@@ -113,5 +114,5 @@ TEST(LocalePicture, ReplacedSourceIsUsedAndRestored)
     }
     EXPECT_EQ(GetSystemTimeFormat().View(), u"%H:%M:%S");
     SetLocalePictureSource(nullptr);
-    EXPECT_NE(dynamic_cast<const PosixLocalePictureSource*>(GetLocalePictureSource().get()), nullptr);
+    EXPECT_NE(dynamic_cast<const UserLocalePictureSource*>(GetLocalePictureSource().get()), nullptr);
 }
