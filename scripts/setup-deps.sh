@@ -7,6 +7,8 @@ packages=(
   g++ cmake make pkg-config
   libgtest-dev libgmock-dev libbenchmark-dev
   tzdata
+  mosquitto
+  nlohmann-json3-dev libmosquitto-dev mosquitto-clients
   "$@"
 )
 
