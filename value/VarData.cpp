@@ -146,6 +146,18 @@ VarData VarData::MakeTyped(std::uint32_t code) noexcept
     return v;
 }
 
+VarData VarData::MakeWord32(std::uint32_t word) noexcept
+{
+    VarData v = MakeTyped(TypeCode::Word32);
+    v.payload_.words[0] = word;
+    return v;
+}
+
+VarData VarData::MakeTimeNumber(const fen::AbsTime& time)
+{
+    return VarData(TypeCode::SSTimeNumber, NewVarDataSSTimeValue(&time));
+}
+
 VarData VarData::MakeAnsi(const char* text, std::uint32_t count)
 {
     return VarData(TypeCode::AnsiString, text == nullptr || count == 0 ? nullptr : NewAnsiGutsLen(text, count));

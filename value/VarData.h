@@ -94,6 +94,10 @@ public:
     static VarData MakeTime(std::uint64_t count) noexcept;
     /// A value of `code` without payload (Null, CairnetBreak, LogicalPulse, ...).
     static VarData MakeTyped(std::uint32_t code) noexcept;
+    /// A code-13 value holding `word`.
+    static VarData MakeWord32(std::uint32_t word) noexcept;
+    /// An SSTimeNumber holding a copy of `time`.
+    static VarData MakeTimeNumber(const fen::AbsTime& time);
     /// AnsiString from `count` bytes; no bytes hold no storage.
     static VarData MakeAnsi(const char* text, std::uint32_t count);
     static VarData NewDictionary();
@@ -101,6 +105,9 @@ public:
                                  const std::uint8_t* data, std::uint32_t dataBytes);
     /// Replaces this value with a bit field, releasing its storage first.
     void SetBitField(std::uint32_t bits) noexcept;
+    /// Replaces the sub-type (bits 16-31 of the type word); the code and the
+    /// payload stay as they are.
+    void SetSubType(std::uint16_t subType) noexcept { type_ = (std::uint32_t{subType} << 16) | Code(); }
 
     std::uint32_t TypeWord() const noexcept { return type_; }
     std::uint16_t Code() const noexcept { return static_cast<std::uint16_t>(type_ & 0xFFFF); }

@@ -238,6 +238,25 @@ TEST(VarData, CopiesOnManyThreadsCountReferencesExactly)
     EXPECT_EQ(probe.Guts()->Release(), 2u);
 }
 
+TEST(VarData, WordsTimeNumbersAndSubTypes)
+{
+    VarData word = VarData::MakeWord32(0x80000001u);
+    EXPECT_EQ(word.Code(), TypeCode::Word32);
+    EXPECT_EQ(word.GetWord32(), 0x80000001u);
+    EXPECT_TRUE(word.ToBool());
+
+    VarData number = VarData::MakeTimeNumber(AbsTime{0x4000000000000000u, 10});
+    EXPECT_EQ(number.Code(), TypeCode::SSTimeNumber);
+    EXPECT_EQ(number.ToDouble(), 10.25);
+    AbsTime time{};
+    EXPECT_FALSE(number.GetTime(time)); // a time number is not a time value
+
+    VarData text("abc");
+    text.SetSubType(7);
+    EXPECT_EQ(text.TypeWord(), 0x71005u);
+    EXPECT_EQ(text.GetString().View(), "abc");
+}
+
 TEST(VarData, ClampToUInt32)
 {
     EXPECT_EQ(ClampToUInt32(-3.5), 0u);
