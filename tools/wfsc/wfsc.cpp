@@ -52,6 +52,10 @@ std::string LogHint(const std::string& name)
 
 int List()
 {
+    // The required services are listed even before anything started them:
+    // loading a definition writes its default when it is absent.
+    for (const std::string& name : RequiredServiceNames())
+        LoadServiceDefinition(name);
     std::printf("%-20s %-10s %-14s %s\n", "NAME", "PID", "STATE", "DISPLAY NAME");
     for (const std::string& name : ListServiceNames()) {
         const auto definition = LoadServiceDefinition(name);
