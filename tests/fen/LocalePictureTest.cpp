@@ -1,6 +1,8 @@
 #include "fen/osdep/LocalePicture.h"
 #include "fen/osdep/UserLocalePictures.h"
 
+#include "ScopedPictureSource.h"
+
 #include <gtest/gtest.h>
 
 #include <string>
@@ -75,18 +77,6 @@ INSTANTIATE_TEST_SUITE_P(
     RowName);
 
 /// The source in use while it lives; the previous one afterwards.
-class ScopedPictureSource {
-public:
-    explicit ScopedPictureSource(std::shared_ptr<const LocalePictureSource> source)
-        : previous_(SetLocalePictureSource(std::move(source)))
-    {
-    }
-    ~ScopedPictureSource() { SetLocalePictureSource(previous_); }
-
-private:
-    std::shared_ptr<const LocalePictureSource> previous_;
-};
-
 class FixedPictures : public LocalePictureSource {
 public:
     WString ShortDatePicture() const override { return WString(u"dd 'de' MMMM 'de' yyyy"); }
@@ -107,7 +97,7 @@ TEST(LocalePicture, PosixLocaleGivesItsOwnFormatsBack)
 TEST(LocalePicture, ReplacedSourceIsUsedAndRestored)
 {
     {
-        ScopedPictureSource scope(std::make_shared<FixedPictures>());
+        qv::test::ScopedPictureSource scope(std::make_shared<FixedPictures>());
         EXPECT_EQ(GetSystemDateFormat().View(), u"%d de %B de %Y");
         EXPECT_EQ(GetSystemTimeFormat().View(), u"%#I:%M %p");
         EXPECT_EQ(GetSystemDecimalSeparator().View(), u",");

@@ -1,6 +1,8 @@
 #include "fen/osdep/LocalePicture.h"
 #include "fen/osdep/TimeText.h"
 
+#include "ScopedPictureSource.h"
+
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -61,19 +63,6 @@ private:
 };
 
 constexpr const char* kCentralEurope = "CET-1CEST,M3.5.0,M10.5.0/3";
-
-/// Makes a picture source current while it lives.
-class ScopedPictureSource {
-public:
-    explicit ScopedPictureSource(std::shared_ptr<const LocalePictureSource> source)
-        : previous_(SetLocalePictureSource(std::move(source)))
-    {
-    }
-    ~ScopedPictureSource() { SetLocalePictureSource(previous_); }
-
-private:
-    std::shared_ptr<const LocalePictureSource> previous_;
-};
 
 class CommaPictures : public LocalePictureSource {
 public:
@@ -179,7 +168,7 @@ TEST(TimeText, LocaleFormatsAndSeparators)
     EXPECT_EQ(Text(t, nullptr, nullptr, 0, kShowUtc), u"06/06/24 14:05:09");
     EXPECT_EQ(Text(t, nullptr, nullptr, 2, kShowUtc, kLocaleSeparator), u"06/06/24 14:05:09.25");
 
-    ScopedPictureSource scope(std::make_shared<CommaPictures>());
+    qv::test::ScopedPictureSource scope(std::make_shared<CommaPictures>());
     EXPECT_EQ(Text(t, nullptr, nullptr, 3, kShowUtc, kLocaleSeparator), u"06 de June 2:05:09,250 PM");
     EXPECT_EQ(Text(t, nullptr, nullptr, 3, kShowUtc, kFullStopSeparator), u"06 de June 2:05:09.250 PM");
 }

@@ -1,6 +1,7 @@
 #include "fen/osdep/RegKey.h"
 #include "fen/osdep/TimeText.h"
 #include "fen/osdep/UserLocalePictures.h"
+#include "ScopedPictureSource.h"
 #include "support/TemporaryHome.h"
 
 #include <gtest/gtest.h>
@@ -26,9 +27,8 @@ TEST(UserLocalePictures, StoredPicturesTakePrecedenceOverThePosixLocale)
     EXPECT_EQ(user->TimePicture().View(), posix.TimePicture().View()); // not stored: the locale's
 
     // The time text follows the stored pictures.
-    auto previous = SetLocalePictureSource(user);
+    qv::test::ScopedPictureSource scope(user);
     const AbsTime time = AbsTimeFromUnixSeconds(1'700'000'000, 0x8000000000000000u); // 2023-11-14 22:13:20.5 UTC
     const WString text = AbsTimeToString(time, nullptr, u"%H:%M:%S", 1, kShowUtc, false, nullptr, kLocaleSeparator);
-    SetLocalePictureSource(previous);
     EXPECT_EQ(text.View(), u"14.11.2023 22:13:20,5");
 }
