@@ -125,8 +125,14 @@ fen::AbsTime TimeFromSeconds(double seconds)
             return fen::AbsTime::Earliest();
         return fen::AbsTime{std::numeric_limits<std::uint64_t>::max(), std::numeric_limits<std::int64_t>::max()};
     }
-    const double whole = std::floor(seconds);
-    const double part = seconds - whole; // exact, in [0, 1)
+    double whole = std::floor(seconds);
+    // Exact in [0, 1) except for a tiny negative number, where 1 - tiny rounds
+    // to 1: that time is the next whole second.
+    double part = seconds - whole;
+    if (part >= 1.0) {
+        whole += 1.0;
+        part = 0.0;
+    }
     return fen::AbsTime{static_cast<std::uint64_t>(std::ldexp(part, 64)), static_cast<std::int64_t>(whole)};
 }
 
@@ -181,9 +187,13 @@ void VarData::ConvertTo(std::uint32_t target)
 {
     const std::uint16_t code = static_cast<std::uint16_t>(target & 0xFFFF);
     // Callers skip same-code conversions; doing nothing keeps a value whose
-    // own-code conversion would otherwise lose its contents.
-    if (Code() == code)
+    // own-code conversion would otherwise lose its contents. A number still
+    // loses its numeric kind, as every conversion to a number does.
+    if (Code() == code) {
+        if (code == TypeCode::Numeric)
+            SetSubType(0);
         return;
+    }
     VarData plain;
     if (Unwrapped(*this, plain)) {
         Swap(plain);

@@ -29,7 +29,10 @@ class IDictionaryIterator;
 class VarData;
 
 /// Owns one dictionary iterator and destroys it with itself. Key and Value
-/// may be read only before the iterator reaches End.
+/// may be read only before the iterator reaches End. A walk keeps the
+/// entries it started on: writing into the dictionary meanwhile gives the
+/// value new storage, and the walk still ends when compared with the
+/// value's End.
 class DictionaryIterator {
 public:
     explicit DictionaryIterator(dynamic::IDictionaryIterator* iterator) noexcept : iterator_(iterator) {}
@@ -157,7 +160,8 @@ public:
     static int Compare(const VarData& a, const VarData& b);
 
     /// Converts this value in place to `target` (low 16 bits); the caller
-    /// makes sure the code differs from the current one.
+    /// makes sure the code differs from the current one. A value of the
+    /// target's code is left as it is, except that a number loses its kind.
     void ConvertTo(std::uint32_t target);
 
 private:

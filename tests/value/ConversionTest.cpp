@@ -1,11 +1,14 @@
 #include "value/FormatGeneral.h"
 #include "value/VarData.h"
+#include "value/dynamic/Interfaces.h"
 
 #include <cmath>
 #include <cstring>
 #include <gtest/gtest.h>
 #include <limits>
 #include <string>
+#include <utility>
+#include <vector>
 
 using namespace qv::value;
 using qv::fen::AbsTime;
@@ -123,6 +126,9 @@ TEST(Conversion, NumbersLogicalsAndPlainCodes)
     kind6.ConvertTo(TypeCode::Logical);
     EXPECT_EQ(kind6.Code(), TypeCode::Logical);
     kind6 = VarData::MakeNumeric(7, 6);
+    kind6.ConvertTo(TypeCode::Numeric);
+    EXPECT_EQ(kind6.TypeWord(), TypeCode::Numeric);
+    EXPECT_EQ(kind6.ToDouble(), 7.0);
     VarData text("2.5");
     text.ConvertTo(TypeCode::Numeric);
     EXPECT_EQ(text.TypeWord(), TypeCode::Numeric);
@@ -155,6 +161,9 @@ TEST(Conversion, NumbersToTimes)
     const AbsTime before = TimeOf(-0.25);
     EXPECT_EQ(before.seconds, -1);
     EXPECT_EQ(before.fraction, 0xC000000000000000u);
+    // Just below zero the fraction would round up to a whole second.
+    EXPECT_EQ(TimeOf(-1e-17), (AbsTime{0, 0}));
+    EXPECT_EQ(TimeOf(-1e-300), (AbsTime{0, 0}));
 
     const AbsTime latest{~0ull, std::numeric_limits<std::int64_t>::max()};
     const double inf = std::numeric_limits<double>::infinity();
@@ -196,4 +205,45 @@ TEST(Conversion, FlexDataWrapsAndUnwraps)
     wrapped.ConvertTo(TypeCode::FlexData);
     wrapped.ConvertTo(TypeCode::AnsiString); // unwrapping alone reaches the target
     EXPECT_EQ(wrapped.GetString().View(), "text");
+}
+
+TEST(Conversion, ForeignVariantsFlattenAndUnwrap)
+{
+    const auto contents = [](const VarData& value) {
+        const std::uint16_t* descriptor = nullptr;
+        std::uint16_t words = 0;
+        const std::uint8_t* data = nullptr;
+        std::uint32_t bytes = 0;
+        static_cast<const qv::value::dynamic::IFBVariantGuts*>(value.Guts())
+            ->GetContents(&descriptor, &words, &data, &bytes);
+        return std::pair(std::vector<std::uint16_t>(descriptor, descriptor + words),
+                         std::vector<std::uint8_t>(data, data + bytes));
+    };
+    using Contents = std::pair<std::vector<std::uint16_t>, std::vector<std::uint8_t>>;
+
+    VarData number = VarData::MakeNumeric(-2, 3);
+    number.ConvertTo(TypeCode::FBVariant);
+    ASSERT_EQ(number.Code(), TypeCode::FBVariant);
+    EXPECT_EQ(contents(number), (Contents{{4, 0x03}, {0xFF, 0xFF, 0xFF, 0xFE}}));
+    EXPECT_EQ(number.ToDouble(), -2.0);
+    EXPECT_EQ(AnsiText(number), "-2");
+    VarData unwrapped = number;
+    unwrapped.ConvertTo(TypeCode::Numeric); // unwrapping reaches the target and keeps the kind
+    EXPECT_EQ(unwrapped.TypeWord(), 0x30003u);
+
+    // What cannot be flattened becomes the empty type.
+    VarData dictionary = VarData::NewDictionary();
+    dictionary.ConvertTo(TypeCode::FBVariant);
+    EXPECT_EQ(contents(dictionary), (Contents{{4, 0x00}, {}}));
+    EXPECT_EQ(AnsiText(dictionary), "");
+
+    // A variant that cannot be read stays as it is and has the empty text.
+    const std::uint16_t broken[] = {0, 0x03};
+    const std::uint8_t data[] = {0, 0, 0, 1};
+    VarData foreign = VarData::MakeFBVariant(broken, 2, data, 4);
+    EXPECT_EQ(foreign.ToDouble(), 0.0);
+    EXPECT_EQ(AnsiText(foreign), "");
+    foreign.ConvertTo(TypeCode::Logical);
+    EXPECT_EQ(foreign.TypeWord(), TypeCode::Logical);
+    EXPECT_FALSE(foreign.ToBool());
 }

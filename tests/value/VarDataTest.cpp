@@ -107,6 +107,8 @@ TEST(VarData, ReadingsAsNumberAndLogical)
     EXPECT_TRUE(VarData("0.5").ToBool());
     EXPECT_FALSE(VarData("off").ToBool());
     EXPECT_FALSE(VarData("0").ToBool());
+    EXPECT_EQ(VarData("+4").ToDouble(), 4.0);
+    EXPECT_EQ(VarData("+-4").ToDouble(), 0.0);
     EXPECT_FALSE(VarData::MakeTyped(TypeCode::AnsiString).ToBool());
 }
 
@@ -190,6 +192,23 @@ TEST(VarData, DictionariesCopyOnWriteAndIterateInKeyOrder)
     DictionaryIterator copy(it);
     ++copy;
     EXPECT_EQ(copy.Value().ToDouble(), 2.0);
+
+    // Writing while walking: the walk covers the entries it started on and
+    // still meets the End of the rewritten value.
+    int visited = 0;
+    for (DictionaryIterator entry = second.Begin(); entry != second.End(); ++entry, ++visited)
+        second[entry.Key()] = Numeric(-1);
+    EXPECT_EQ(visited, 3);
+    EXPECT_EQ(second.Find(VarData("b"))->ToDouble(), -1.0);
+
+    // A NaN key is a key of its own, not a match for every number.
+    VarData numbers = VarData::NewDictionary();
+    numbers[Numeric(2)] = VarData("two");
+    numbers[Numeric(kNaN)] = VarData("nan");
+    numbers[Numeric(1)] = VarData("one");
+    EXPECT_EQ(numbers.Size(), 3u);
+    EXPECT_EQ(numbers.Find(Numeric(2))->GetString().View(), "two");
+    EXPECT_EQ(numbers.Find(Numeric(-kNaN))->GetString().View(), "nan");
 
     VarData typedOnly = VarData::MakeTyped(TypeCode::Dictionary);
     EXPECT_FALSE(typedOnly.Begin() != typedOnly.End());

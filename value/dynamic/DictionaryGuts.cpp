@@ -8,6 +8,7 @@
 #include "value/dynamic/DynamicData.h"
 #include "value/dynamic/RefCounted.h"
 
+#include <cmath>
 #include <cstdlib>
 #include <cstring>
 #include <map>
@@ -17,8 +18,17 @@
 namespace qv::value::dynamic {
 namespace {
 
+/// The value order, except that a NaN key, which that order finds equal to
+/// every number, sorts after the other numbers and equals only another NaN.
 struct KeyLess {
-    bool operator()(const VarData& a, const VarData& b) const { return VarData::Compare(a, b) < 0; }
+    bool operator()(const VarData& a, const VarData& b) const
+    {
+        double x = 0.0;
+        double y = 0.0;
+        if (a.GetDouble(x) && b.GetDouble(y) && (std::isnan(x) || std::isnan(y)))
+            return !std::isnan(x);
+        return VarData::Compare(a, b) < 0;
+    }
 };
 
 using Entries = std::map<VarData, VarData, KeyLess>;
@@ -44,13 +54,22 @@ public:
     const VarData* Value() const override { return &position_->second; }
     const VarData* Key() const override { return &position_->first; }
     void Advance() override { ++position_; }
+    /// Iterators of two storages are equal only when both are past their
+    /// last entry. A write during a walk gives the value new storage (the
+    /// walk holds the old one), so a loop that tests against the value's End
+    /// after each write still stops at the end of the entries it walks.
     bool Equals(const IDictionaryIterator* other) const override
     {
-        return position_ == static_cast<const Iterator*>(other)->position_;
+        const auto* that = static_cast<const Iterator*>(other);
+        if (owner_ != that->owner_)
+            return AtEnd() && that->AtEnd();
+        return position_ == that->position_;
     }
     IDictionaryIterator* Copy() const override { return new Iterator(owner_, position_); }
 
 private:
+    bool AtEnd() const;
+
     const DictionaryGuts* owner_;
     Entries::const_iterator position_;
 };
@@ -103,6 +122,7 @@ public:
     }
     std::uint32_t Count() const override { return static_cast<std::uint32_t>(entries_.size()); }
 
+    bool IsEnd(Entries::const_iterator position) const { return position == entries_.end(); }
     void Hold() const { const_cast<DictionaryGuts*>(this)->AddRef(); }
     void Drop() const { const_cast<DictionaryGuts*>(this)->Release(); }
 
@@ -114,6 +134,11 @@ Iterator::Iterator(const DictionaryGuts* owner, Entries::const_iterator position
     : owner_(owner), position_(position)
 {
     owner_->Hold();
+}
+
+bool Iterator::AtEnd() const
+{
+    return owner_->IsEnd(position_);
 }
 
 void Iterator::Destroy()

@@ -13,7 +13,8 @@
 ///   non-empty. Bytes compare byte by byte, vectors element by element,
 ///   dictionaries entry by entry (key, then value); a shorter one that is a
 ///   prefix of the other sorts first.
-/// - A dictionary orders its keys by the value order and shows as
+/// - A dictionary orders its keys by the value order (a NaN key after the
+///   other numbers, and equal only to another NaN) and shows as
 ///   "{key: value, ...}", each key and value in its own text form.
 /// - A time reads as seconds since the time epoch and as true unless it is
 ///   the earliest time (no time); times compare chronologically.

@@ -21,9 +21,11 @@ std::string_view Trim(std::string_view text)
 bool ParseNumber(std::string_view text, double& value)
 {
     text = Trim(text);
-    if (!text.empty() && text.front() == '+')
+    // from_chars takes a minus sign only; a plus sign may stand in its place.
+    const bool plus = !text.empty() && text.front() == '+';
+    if (plus)
         text.remove_prefix(1);
-    if (text.empty())
+    if (text.empty() || (plus && text.front() == '-'))
         return false;
     const char* last = text.data() + text.size();
     auto [end, error] = std::from_chars(text.data(), last, value);
