@@ -1,0 +1,377 @@
+#include "network/realtime/OrvekRealTime.h"
+#include "network/realtime/HostResolver.h"
+
+#include "RealTimeTestSupport.h"
+
+#include "network/protocol/Catalogue.h"
+#include "network/protocol/ProcessState.h"
+#include "network/protocol/Topics.h"
+#include "network/protocol/ValueMessage.h"
+#include "network/protocol/WriteRequest.h"
+
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <map>
+#include <sys/wait.h>
+#include <thread>
+#include <unistd.h>
+
+namespace qv::test {
+namespace {
+
+namespace proto = network::protocol;
+namespace Q = rt::QualityBits;
+using namespace std::chrono_literals;
+
+/// A change other than the "connecting" that a brand-new connection shows first.
+bool Settled(const RecordedChange& change)
+{
+    return change.quality != Q::Connecting;
+}
+
+std::string ValueJson(double number)
+{
+    return proto::VarDataToJson(value::VarData::MakeNumeric(number)).dump();
+}
+
+fen::AbsTime At(std::int64_t seconds)
+{
+    return {0, seconds};
+}
+
+/// One process "boiler" on the broker, published with raw MQTT.
+class FakeProcess {
+public:
+    explicit FakeProcess(std::uint16_t port, std::string name = "boiler", const char* user = nullptr,
+                         const char* password = nullptr)
+        : client_(port, user, password), name_(std::move(name))
+    {
+    }
+    void State(proto::RunState state)
+    {
+        client_.Publish(proto::ProcessTopic(name_, proto::TopicKind::State), proto::EncodeProcessState({state, {}, {}}));
+    }
+    void Catalogue(const std::vector<std::pair<std::string, std::uint32_t>>& variables)
+    {
+        proto::Catalogue catalogue;
+        for (const auto& [path, access] : variables)
+            catalogue.variables.push_back({path, 3, 0, access});
+        client_.Publish(proto::ProcessTopic(name_, proto::TopicKind::Catalogue), proto::EncodeCatalogue(catalogue));
+    }
+    void Value(const std::string& path, double number, std::uint64_t quality = 0, fen::AbsTime time = At(3786912000))
+    {
+        proto::ValueMessage message;
+        message.value = value::VarData::MakeNumeric(number);
+        message.quality = quality;
+        message.time = time;
+        client_.Publish(proto::NamedTopic(name_, proto::TopicKind::Value, path), proto::EncodeValueMessage(message));
+    }
+    /// Running, with readable "drum.level" = `number`.
+    void Standard(double number)
+    {
+        Catalogue({{"drum.level", 3}, {"drum.empty", 1}});
+        Value("drum.level", number);
+        State(proto::RunState::Running);
+    }
+    RawClient& Client() { return client_; }
+
+private:
+    RawClient client_;
+    std::string name_;
+};
+
+class RealTimeTest : public ::testing::Test {
+protected:
+    void SetUp() override { StartBroker({}); }
+    void TearDown() override
+    {
+        for (auto* subscription : subscriptions_)
+            subscription->Release();
+        subscriptions_.clear();
+        if (realTime_ != nullptr)
+            realTime_->Release();
+        if (session_ != nullptr)
+            session_->Release();
+        rt::SetHostResolver(nullptr);
+    }
+
+    void StartBroker(TestBrokerOptions options)
+    {
+        broker_.reset();
+        broker_ = std::make_unique<TestBroker>(std::move(options));
+        SetDataPort(broker_->Port());
+    }
+
+    rt::IOrvekRealTime* RealTime()
+    {
+        if (realTime_ == nullptr) {
+            network::session::NewOrvekSession(&session_);
+            EXPECT_TRUE(rt::NewOrvekRealTime(session_, &receiver_, &realTime_));
+        }
+        return realTime_;
+    }
+
+    rt::ISubscription* Subscribe(const char16_t* url, std::int32_t handle)
+    {
+        rt::ISubscription* subscription = nullptr;
+        EXPECT_EQ(RealTime()->Subscribe(url, handle, nullptr, &subscription), 0);
+        EXPECT_NE(subscription, nullptr);
+        if (subscription != nullptr)
+            subscriptions_.push_back(subscription);
+        return subscription;
+    }
+
+    void Unsubscribe(rt::ISubscription* subscription)
+    {
+        std::erase(subscriptions_, subscription);
+        subscription->Release();
+    }
+
+    TemporaryHome home_;
+    std::unique_ptr<TestBroker> broker_;
+    RecordingReceiver receiver_;
+    network::session::IOrvekSession* session_ = nullptr;
+    rt::IOrvekRealTime* realTime_ = nullptr;
+    std::vector<rt::ISubscription*> subscriptions_;
+};
+
+TEST_F(RealTimeTest, DeliversLatestValueAtOnceThenEachChangeWithItsMask)
+{
+    FakeProcess process(broker_->Port());
+    process.Standard(42.5);
+    Subscribe(u"\\\\localhost\\boiler\\drum.level", 7);
+
+    auto first = receiver_.WaitFor(7, Settled);
+    ASSERT_TRUE(first);
+    EXPECT_EQ(first->mask, rt::ChangeMask::All); // everything differs from "connecting"
+    EXPECT_EQ(first->value, ValueJson(42.5));
+    EXPECT_EQ(first->quality, 0u);
+    EXPECT_EQ(first->error, 0);
+    EXPECT_EQ(first->time, At(3786912000));
+
+    process.Value("drum.level", 43.0);
+    auto value = receiver_.WaitFor(7, [](const auto&) { return true; });
+    ASSERT_TRUE(value);
+    EXPECT_EQ(value->mask, rt::ChangeMask::Value);
+    EXPECT_EQ(value->value, ValueJson(43.0));
+
+    process.Value("drum.level", 43.0, 0, At(3786912001));
+    auto time = receiver_.WaitFor(7, [](const auto&) { return true; });
+    ASSERT_TRUE(time);
+    EXPECT_EQ(time->mask, rt::ChangeMask::Timestamp);
+
+    // The process's own quality bits pass through.
+    process.Value("drum.level", 43.0, 0x1, At(3786912001));
+    auto quality = receiver_.WaitFor(7, [](const auto&) { return true; });
+    ASSERT_TRUE(quality);
+    EXPECT_EQ(quality->mask, rt::ChangeMask::QualityOrError | rt::ChangeMask::QualityOrError2);
+    EXPECT_EQ(quality->quality, 0x1u);
+
+    // Republishing the same message changes nothing.
+    process.Value("drum.level", 43.0, 0x1, At(3786912001));
+    process.Value("drum.level", 44.0, 0x1, At(3786912001));
+    auto next = receiver_.WaitFor(7, [](const auto&) { return true; });
+    ASSERT_TRUE(next);
+    EXPECT_EQ(next->value, ValueJson(44.0));
+    EXPECT_EQ(receiver_.Changes(7).back().value, ValueJson(44.0));
+    EXPECT_EQ(receiver_.Changes(7).size(), receiver_.Changes(7).front().quality == Q::Connecting ? 6u : 5u);
+}
+
+TEST_F(RealTimeTest, ReportsMissingProcessVariableAndValue)
+{
+    FakeProcess process(broker_->Port());
+    process.Standard(1.0);
+    // Another spelling of the host: the local machine's "localhost" in capitals.
+    Subscribe(u"\\\\LOCALHOST\\boiler\\no.such", 1);
+    Subscribe(u"\\\\localhost\\boiler\\drum.empty", 2);
+    Subscribe(u"\\\\localhost\\nobody\\drum.level", 3);
+
+    auto missing = receiver_.WaitFor(1, Settled);
+    ASSERT_TRUE(missing);
+    EXPECT_EQ(missing->quality, Q::Nonexistant);
+    EXPECT_LT(missing->error, 0);
+    auto empty = receiver_.WaitFor(2, Settled);
+    ASSERT_TRUE(empty);
+    EXPECT_EQ(empty->quality, Q::NoKnownValue);
+    auto nobody = receiver_.WaitFor(3, Settled);
+    ASSERT_TRUE(nobody);
+    EXPECT_EQ(nobody->quality, Q::Nonexistant);
+
+    // The variable appears later and is delivered as a change.
+    process.Value("drum.empty", 5.0);
+    auto appeared = receiver_.WaitFor(2, [](const auto&) { return true; });
+    ASSERT_TRUE(appeared);
+    EXPECT_EQ(appeared->quality, 0u);
+    EXPECT_EQ(appeared->value, ValueJson(5.0));
+    EXPECT_EQ(appeared->mask & rt::ChangeMask::Value, rt::ChangeMask::Value);
+}
+
+TEST_F(RealTimeTest, InvalidURLIsDeliveredAsAChange)
+{
+    for (const char16_t* url : {u"\\\\host\\", u"\\\\localhost\\boiler", u"relative.path", u"\\\\h\\p\\'unclosed"}) {
+        SCOPED_TRACE(std::u16string(url).size());
+        auto* subscription = Subscribe(url, 9);
+        auto change = receiver_.WaitFor(9, [](const auto&) { return true; });
+        ASSERT_TRUE(change);
+        EXPECT_EQ(change->quality, Q::InvalidURL);
+        EXPECT_EQ(change->mask, rt::ChangeMask::All);
+        EXPECT_LT(subscription->Write(value::VarData::MakeNumeric(1)), 0);
+    }
+}
+
+TEST_F(RealTimeTest, ProcessFailureWhenTheProcessVanishes)
+{
+    FakeProcess process(broker_->Port());
+    process.Standard(3.0);
+    // A process that left a Last Will on its state topic, killed without warning.
+    const std::string port = std::to_string(broker_->Port());
+    const std::string will = proto::LastWillPayload();
+    const pid_t child = fork();
+    ASSERT_GE(child, 0);
+    if (child == 0) {
+        execl("/usr/bin/mosquitto_sub", "mosquitto_sub", "-h", "127.0.0.1", "-p", port.c_str(), "-t", "x/y",
+              "--will-topic", "orvek/v1/boiler/state", "--will-payload", will.c_str(), "--will-retain",
+              "--will-qos", "1", static_cast<char*>(nullptr));
+        _exit(127);
+    }
+    Subscribe(u"\\\\localhost\\boiler\\drum.level", 4);
+    auto good = receiver_.WaitFor(4, Settled);
+    ASSERT_TRUE(good);
+    EXPECT_EQ(good->quality, 0u);
+    std::this_thread::sleep_for(200ms); // let the child connect
+    kill(child, SIGKILL);
+    waitpid(child, nullptr, 0);
+
+    auto failed = receiver_.WaitFor(4, [](const auto&) { return true; });
+    ASSERT_TRUE(failed);
+    EXPECT_EQ(failed->quality, Q::ProcessFailure);
+    EXPECT_EQ(failed->value, ValueJson(3.0)); // the last value stays visible
+    EXPECT_EQ(failed->mask, rt::ChangeMask::QualityOrError | rt::ChangeMask::QualityOrError2);
+
+    process.State(proto::RunState::Running);
+    auto back = receiver_.WaitFor(4, [](const auto&) { return true; });
+    ASSERT_TRUE(back);
+    EXPECT_EQ(back->quality, 0u);
+}
+
+TEST_F(RealTimeTest, DisconnectedThenConnectingThenResumesAfterRestart)
+{
+    {
+        FakeProcess process(broker_->Port());
+        process.Standard(10.0);
+        Subscribe(u"\\\\localhost\\boiler\\drum.level", 5);
+        ASSERT_TRUE(receiver_.WaitFor(5, [](const auto& c) { return c.quality == 0; }));
+        broker_->Stop();
+        auto lost = receiver_.WaitForQuality(5, Q::Disconnected);
+        ASSERT_TRUE(lost);
+        EXPECT_EQ(lost->value, ValueJson(10.0));
+        EXPECT_TRUE(receiver_.WaitForQuality(5, Q::Connecting));
+        EXPECT_TRUE(receiver_.WaitForQuality(5, Q::ServiceLookupFailure));
+    }
+    broker_->Start();
+    FakeProcess restarted(broker_->Port());
+    restarted.Standard(11.0);
+    auto resumed = receiver_.WaitFor(5, [](const auto& c) { return c.quality == 0 && c.value == ValueJson(11.0); });
+    ASSERT_TRUE(resumed);
+}
+
+TEST_F(RealTimeTest, ServiceLookupFailureWhenNoDataServerListens)
+{
+    SetDataPort(FreeLoopbackPort());
+    Subscribe(u"\\\\localhost\\boiler\\drum.level", 6);
+    auto change = receiver_.WaitForQuality(6, Q::ServiceLookupFailure);
+    ASSERT_TRUE(change);
+    EXPECT_EQ(change->error, rt::ErrorCodes::ConnectionRefused);
+}
+
+class MapResolver : public rt::HostResolver {
+public:
+    explicit MapResolver(std::map<std::string, std::string> names) : names_(std::move(names)) {}
+    std::optional<std::string> Resolve(const std::string& host) const override
+    {
+        ++calls;
+        const auto found = names_.find(host);
+        return found == names_.end() ? std::nullopt : std::optional<std::string>(found->second);
+    }
+    mutable std::atomic<int> calls{0};
+
+private:
+    std::map<std::string, std::string> names_;
+};
+
+TEST_F(RealTimeTest, HostNamesGoThroughTheResolver)
+{
+    auto resolver = std::make_shared<MapResolver>(std::map<std::string, std::string>{{"plant-a", "127.0.0.1"}});
+    rt::SetHostResolver(resolver);
+    FakeProcess process(broker_->Port());
+    process.Standard(8.0);
+    Subscribe(u"\\\\plant-a\\boiler\\drum.level", 1);
+    Subscribe(u"\\\\nowhere\\boiler\\drum.level", 2);
+
+    auto found = receiver_.WaitFor(1, Settled);
+    ASSERT_TRUE(found);
+    EXPECT_EQ(found->value, ValueJson(8.0));
+    auto missing = receiver_.WaitForQuality(2, Q::DnsFailure);
+    ASSERT_TRUE(missing);
+    EXPECT_EQ(missing->error, rt::ErrorCodes::HostNotFound);
+
+    // The local names never reach the resolver.
+    const int before = resolver->calls;
+    Subscribe(u"\\\\localhost\\boiler\\drum.level", 3);
+    Subscribe(u"\\\\.\\boiler\\drum.level", 4);
+    EXPECT_TRUE(receiver_.WaitFor(3, [](const auto& c) { return c.quality == 0; }));
+    EXPECT_TRUE(receiver_.WaitFor(4, [](const auto& c) { return c.quality == 0; }));
+    EXPECT_LE(resolver->calls - before, 1); // at most a retry for "nowhere"
+}
+
+TEST_F(RealTimeTest, AccessDeniedForAnUnreadableVariableAndARefusedLogin)
+{
+    FakeProcess process(broker_->Port());
+    process.Catalogue({{"secret", 2}});
+    process.Value("secret", 1.0);
+    process.State(proto::RunState::Running);
+    Subscribe(u"\\\\localhost\\boiler\\secret", 1);
+    EXPECT_TRUE(receiver_.WaitForQuality(1, Q::AccessDenied));
+
+    StartBroker({{{"alice", "wonder"}}, "", true, ""});
+    Subscribe(u"\\\\localhost\\boiler\\drum.level", 2); // the session has no login
+    auto refused = receiver_.WaitForQuality(2, Q::AccessDenied);
+    ASSERT_TRUE(refused);
+    EXPECT_EQ(refused->error, rt::ErrorCodes::AccessDenied);
+}
+
+TEST_F(RealTimeTest, WriteSendsARequestAndReleaseStopsDeliveries)
+{
+    FakeProcess process(broker_->Port());
+    process.Standard(1.0);
+    process.Client().Subscribe("orvek/v1/boiler/write/+");
+    auto* subscription = Subscribe(u"\\\\localhost\\boiler\\drum.level", 3);
+    ASSERT_TRUE(receiver_.WaitFor(3, Settled));
+
+    ASSERT_EQ(subscription->Write(value::VarData::MakeNumeric(55)), 0);
+    auto request = process.Client().WaitForMessage();
+    ASSERT_TRUE(request);
+    EXPECT_EQ(request->first, "orvek/v1/boiler/write/drum.level");
+    const auto decoded = proto::DecodeWriteRequest(request->second);
+    EXPECT_EQ(proto::VarDataToJson(decoded.value).dump(), ValueJson(55));
+    EXPECT_FALSE(decoded.id.empty());
+
+    Unsubscribe(subscription);
+    process.Value("drum.level", 2.0);
+    std::this_thread::sleep_for(300ms);
+    EXPECT_EQ(receiver_.Changes(3).back().value, ValueJson(1.0));
+}
+
+TEST_F(RealTimeTest, ReleasingTheRealTimeObjectReleasesTheReceiver)
+{
+    Subscribe(u"\\\\localhost\\boiler\\drum.level", 1);
+    ASSERT_TRUE(receiver_.WaitFor(1, [](const auto&) { return true; }));
+    EXPECT_GT(receiver_.References(), 1u);
+    realTime_->Release();
+    realTime_ = nullptr;
+    EXPECT_EQ(receiver_.References(), 1u);
+}
+
+} // namespace
+} // namespace qv::test
