@@ -461,11 +461,16 @@ struct Connection::State {
     }
 
     /// Tells subscriptions added while not connected what the condition is.
+    /// Once the connection is up they wait for their barrier instead: the
+    /// condition of a connection is then "good", which says nothing yet about
+    /// the variable.
     void TellFresh()
     {
         if (!freshPending)
             return;
         freshPending = false;
+        if (connected)
+            return;
         for (auto& [id, sub] : subs) {
             if (!sub.delivered)
                 Update(sub, Evaluate(sub));
