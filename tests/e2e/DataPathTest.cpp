@@ -12,7 +12,6 @@
 #include <fstream>
 #include <limits>
 #include <mutex>
-#include <regex>
 #include <set>
 #include <spawn.h>
 #include <sstream>
@@ -219,10 +218,15 @@ std::vector<std::string> ExampleCommands(std::uint16_t port)
         ADD_FAILURE() << "no mosquitto_pub example in " << PROTOCOL_PAGE;
         return blocks;
     }
-    const std::regex block("```sh\n([^`]*)```");
-    for (auto it = std::sregex_iterator(page.begin() + static_cast<std::ptrdiff_t>(section), page.end(), block);
-         it != std::sregex_iterator(); ++it) {
-        std::string commands = (*it)[1];
+    const std::string open = "```sh\n";
+    const std::string close = "```";
+    for (auto start = page.find(open, section); start != std::string::npos; start = page.find(open, start)) {
+        start += open.size();
+        const auto end = page.find(close, start);
+        if (end == std::string::npos)
+            break;
+        std::string commands = page.substr(start, end - start);
+        start = end + close.size();
         if (commands.find("mosquitto_sub") != std::string::npos)
             continue;
         const std::string defaultPort = "-p 18883 ";
