@@ -60,6 +60,8 @@ CatalogueVariable DecodeVariable(const Json& json)
     if (const Json* access = Member(json, "access"))
         variable.access =
             static_cast<std::uint32_t>(AsInteger(*access, 0, std::numeric_limits<std::uint32_t>::max(), "access"));
+    if (const Json* valued = Member(json, "valued"))
+        variable.valued = AsBool(*valued, "valued");
     return variable;
 }
 
@@ -88,8 +90,11 @@ std::string EncodeCatalogue(const Catalogue& catalogue)
     }
     Json variables = Json::array();
     for (const CatalogueVariable& variable : catalogue.variables)
-        variables.push_back(
-            {{"path", variable.path}, {"type", variable.type}, {"kind", variable.kind}, {"access", variable.access}});
+        variables.push_back({{"path", variable.path},
+                             {"type", variable.type},
+                             {"kind", variable.kind},
+                             {"access", variable.access},
+                             {"valued", variable.valued}});
     Json alarms = Json::array();
     for (const CatalogueAlarm& alarm : catalogue.alarms) {
         Json entry{{"id", alarm.id}, {"text", alarm.text}, {"severity", alarm.severity}};

@@ -4,12 +4,12 @@
 /// variables and alarms of one process.
 ///
 ///     {"v":1,
-///      "variables":[{"path":"drum.level","type":3,"kind":0,"access":3}],
+///      "variables":[{"path":"drum.level","type":3,"kind":0,"access":3,"valued":true}],
 ///      "alarms":[{"id":"drum-high","text":"Drum level high","severity":700,
 ///                 "path":"drum.level"}]}
 ///
-/// A process publishes it whenever its set of variables or alarms changes;
-/// the latest one is the whole truth.
+/// A process publishes it whenever its set of variables or alarms changes
+/// and when a variable gets its first value; the latest one is the whole truth.
 
 #include <cstdint>
 #include <string>
@@ -33,6 +33,10 @@ struct CatalogueVariable {
     std::uint8_t kind = 0;
     /// Access bits; bits other than Read and Write travel unchanged.
     std::uint32_t access = Access::Read;
+    /// Whether the process has published a value for the variable, which its
+    /// value topic then retains. A subscriber that is given no value for a
+    /// valued variable knows the value was withheld from it.
+    bool valued = false;
 };
 
 struct CatalogueAlarm {
@@ -56,9 +60,9 @@ struct Catalogue {
 std::string EncodeCatalogue(const Catalogue& catalogue);
 
 /// The catalogue in `payload`. "v" and "variables" are required, "alarms"
-/// optional; in a variable "path" and "type" are required, "kind" (0) and
-/// "access" (read only) optional; in an alarm "id" is required, "text",
-/// "severity" and "path" optional. Unknown members are ignored. Whatever
+/// optional; in a variable "path" and "type" are required, "kind" (0),
+/// "access" (read only) and "valued" (false) optional; in an alarm "id" is
+/// required, "text", "severity" and "path" optional. Unknown members are ignored. Whatever
 /// EncodeCatalogue would refuse, and anything malformed, throws ProtocolError.
 Catalogue DecodeCatalogue(std::string_view payload);
 

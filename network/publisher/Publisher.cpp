@@ -157,7 +157,7 @@ struct Publisher::Impl {
     {
         proto::Catalogue catalogue;
         for (const auto& [path, variable] : variables)
-            catalogue.variables.push_back({path, variable.type, variable.kind, variable.access});
+            catalogue.variables.push_back({path, variable.type, variable.kind, variable.access, variable.hasValue});
         for (const auto& [id, alarm] : alarms)
             catalogue.alarms.push_back(alarm.definition);
         Send(proto::ProcessTopic(process, proto::TopicKind::Catalogue), proto::EncodeCatalogue(catalogue), 1, true);
@@ -177,6 +177,17 @@ struct Publisher::Impl {
                  true);
     }
 
+    /// With `mutex` held, after the variable's value has been sent: a first
+    /// value makes the catalogue call the variable valued. Sent after the
+    /// value, so that the broker holds the value before the catalogue says so.
+    void MarkValued(Variable& variable)
+    {
+        if (variable.hasValue)
+            return;
+        variable.hasValue = true;
+        SendCatalogue();
+    }
+
     int SendState(proto::RunState state)
     {
         proto::ProcessState message;
@@ -187,12 +198,14 @@ struct Publisher::Impl {
     }
 
     /// Sends what the broker retains for this process; "running" follows
-    /// once the write and acknowledge subscriptions are in place.
+    /// once the write and acknowledge subscriptions are in place. The values
+    /// go ahead of the catalogue, so that the broker never holds a catalogue
+    /// that calls a variable valued without holding its value too.
     void SendEverything()
     {
-        SendCatalogue();
         for (const auto& [path, variable] : variables)
             SendValue(path, variable);
+        SendCatalogue();
         for (const auto& [id, alarm] : alarms)
             SendAlarm(id, alarm);
     }
@@ -359,8 +372,8 @@ struct Publisher::Impl {
             return {proto::WriteStatus::BadValue, "the value cannot be published"};
         }
         variable.latest = std::move(message);
-        variable.hasValue = true;
         Send(proto::NamedTopic(process, proto::TopicKind::Value, path), payload, options.valueQos, true);
+        MarkValued(variable);
         return {proto::WriteStatus::Written, {}};
     }
 
@@ -579,16 +592,20 @@ void Publisher::DeclareVariable(std::string_view path, std::uint16_t type, std::
     Impl::Variable& variable = found->second;
     if (!added && variable.type == type && variable.kind == kind && variable.access == access)
         return;
-    if (!added && (variable.type != type || variable.kind != kind)) {
-        // The old value no longer suits the variable.
+    // The old value no longer suits a variable whose type or kind changes.
+    const bool dropValue = !added && (variable.type != type || variable.kind != kind);
+    if (dropValue) {
         variable.hasValue = false;
         variable.latest = {};
-        impl_->Send(proto::NamedTopic(impl_->process, proto::TopicKind::Value, found->first), {}, 1, true);
     }
     variable.type = type;
     variable.kind = kind;
     variable.access = access;
     impl_->SendCatalogue();
+    // Emptied after the catalogue stops calling the variable valued, so that
+    // the value is never missing while the catalogue says it is there.
+    if (dropValue)
+        impl_->Send(proto::NamedTopic(impl_->process, proto::TopicKind::Value, found->first), {}, 1, true);
 }
 
 bool Publisher::RemoveVariable(std::string_view path)
@@ -616,9 +633,9 @@ void Publisher::Publish(std::string_view path, const VarData& value, std::uint64
         message.value.SetSubType(found->second.kind);
     const std::string payload = proto::EncodeValueMessage(message);
     found->second.latest = std::move(message);
-    found->second.hasValue = true;
     impl_->Send(proto::NamedTopic(impl_->process, proto::TopicKind::Value, found->first), payload,
                 impl_->options.valueQos, true);
+    impl_->MarkValued(found->second);
 }
 
 VarData Publisher::Value(std::string_view path) const

@@ -116,10 +116,16 @@ struct Connection::State {
         std::int32_t lastError = 0;
         fen::AbsTime lastTime = fen::AbsTime::Earliest();
     };
+    /// What the process's catalogue says of one variable.
+    struct Listed {
+        std::uint32_t access = 0;
+        /// The process has published a value, which the value topic retains.
+        bool valued = false;
+    };
     struct Process {
         int refs = 0;
         std::optional<proto::RunState> state;
-        std::optional<std::map<std::string, std::uint32_t>> catalogue; ///< path to access bits
+        std::optional<std::map<std::string, Listed>> catalogue; ///< by path
         bool malformed = false;
         bool denied = false;
     };
@@ -210,10 +216,18 @@ struct Connection::State {
         const auto entry = process.catalogue->find(sub.path);
         if (entry == process.catalogue->end())
             return none(QualityBits::Nonexistant, ErrorCodes::NoSuchVariable);
-        if ((entry->second & proto::Access::Read) == 0)
+        if ((entry->second.access & proto::Access::Read) == 0)
             return none(QualityBits::AccessDenied, ErrorCodes::AccessDenied);
-        if (!topic.message)
+        if (!topic.message) {
+            // The process publishes a value ahead of the catalogue that calls
+            // the variable valued, so once the retained messages are in (the
+            // subscription is ready) a missing value is one the broker
+            // withholds: its access-control list grants the subscription
+            // but does not let the value through.
+            if (entry->second.valued)
+                return none(QualityBits::AccessDenied, ErrorCodes::AccessDenied);
             return none(QualityBits::NoKnownValue, 0);
+        }
         outcome.value = topic.message->value;
         outcome.quality = topic.message->quality;
         outcome.error = topic.message->error;
@@ -391,9 +405,9 @@ struct Connection::State {
             process.malformed = false;
             if (!payload.empty()) {
                 try {
-                    std::map<std::string, std::uint32_t> variables;
+                    std::map<std::string, Listed> variables;
                     for (const auto& variable : proto::DecodeCatalogue(payload).variables)
-                        variables.emplace(variable.path, variable.access);
+                        variables.emplace(variable.path, Listed{variable.access, variable.valued});
                     process.catalogue = std::move(variables);
                 } catch (...) {
                     process.malformed = true;

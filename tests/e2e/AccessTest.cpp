@@ -48,7 +48,7 @@ TEST_F(E2EAccess, RefusedPasswordFailsLoginAndLeavesTheSessionAnonymous)
     EXPECT_EQ(shown->data.ToDouble(), 4.0);
 }
 
-TEST_F(E2EAccess, UnreadableVariablesShowNoValue)
+TEST_F(E2EAccess, UnreadableVariablesShowAccessDeniedAndNoValue)
 {
     // "viewer" may read the process's state and catalogue and one value topic.
     StartBroker({kUsers,
@@ -85,15 +85,13 @@ TEST_F(E2EAccess, UnreadableVariablesShowNoValue)
     EXPECT_EQ(writeOnly->error, rt::ErrorCodes::AccessDenied);
     EXPECT_EQ(writeOnly->data.Code(), TypeCode::Empty);
 
-    // The access-control list forbids the value topic. mosquitto 2.0.11
-    // grants the subscription and silently withholds the retained value, so
-    // the monitor cannot tell this from a variable without a value and shows
-    // "no known value"; a broker that refuses the subscription gives "access
-    // denied". Either way the value must not get through.
+    // The access-control list forbids the value topic. The broker grants the
+    // subscription and silently withholds the retained value; the catalogue
+    // says the process published one, so the monitor shows "access denied".
     const auto forbidden = monitor.Receiver().WaitFor(3, Settled);
     ASSERT_TRUE(forbidden);
-    EXPECT_TRUE(forbidden->quality == Q::NoKnownValue || forbidden->quality == Q::AccessDenied)
-        << std::hex << forbidden->quality;
+    EXPECT_EQ(forbidden->quality, Q::AccessDenied) << std::hex << forbidden->quality;
+    EXPECT_EQ(forbidden->error, rt::ErrorCodes::AccessDenied);
     publisher.Publish("drum.secret", VarData::MakeNumeric(5));
     publisher.Publish("drum.level", VarData::MakeNumeric(6));
     ASSERT_TRUE(monitor.Receiver().WaitFor(1, [](const auto& c) { return c.data.ToDouble() == 6.0; }));

@@ -29,6 +29,7 @@ TEST(ProtocolMessages, ExampleOfTheProtocolPage)
     EXPECT_EQ(catalogue.variables[0].path, "drum.level");
     EXPECT_EQ(catalogue.variables[0].type, qv::value::TypeCode::Numeric);
     EXPECT_EQ(catalogue.variables[0].access, Access::Read);
+    EXPECT_FALSE(catalogue.variables[0].valued); // absent: no value published
 
     const ValueMessage value = DecodeValueMessage(
         R"({"v":1,"value":{"t":3,"n":42.5},"quality":"0x0000000000000000","error":0,)"
@@ -62,16 +63,18 @@ TEST(ProtocolMessages, CatalogueRoundTripAndRules)
 {
     Catalogue catalogue;
     catalogue.variables.push_back({"drum.level", 3, 7, Access::Read | Access::Write});
-    catalogue.variables.push_back({"a\\'x.y'", 0x1005, 0, Access::Read});
+    catalogue.variables.push_back({"a\\'x.y'", 0x1005, 0, Access::Read, true});
     catalogue.alarms.push_back({"drum high/1", "Drum level high", 700, "drum.level"});
     const std::string text = EncodeCatalogue(catalogue);
     EXPECT_EQ(text, R"({"alarms":[{"id":"drum high/1","path":"drum.level","severity":700,"text":"Drum level high"}],)"
-                    R"("v":1,"variables":[{"access":3,"kind":7,"path":"drum.level","type":3},)"
-                    R"({"access":1,"kind":0,"path":"a\\'x.y'","type":4101}]})");
+                    R"("v":1,"variables":[{"access":3,"kind":7,"path":"drum.level","type":3,"valued":false},)"
+                    R"({"access":1,"kind":0,"path":"a\\'x.y'","type":4101,"valued":true}]})");
     const Catalogue back = DecodeCatalogue(text);
     ASSERT_EQ(back.variables.size(), 2u);
     EXPECT_EQ(back.variables[1].path, "a\\'x.y'");
     EXPECT_EQ(back.variables[0].kind, 7);
+    EXPECT_FALSE(back.variables[0].valued);
+    EXPECT_TRUE(back.variables[1].valued);
     ASSERT_EQ(back.alarms.size(), 1u);
     EXPECT_EQ(back.alarms[0].id, "drum high/1");
     EXPECT_EQ(back.alarms[0].severity, 700);
@@ -82,6 +85,8 @@ TEST(ProtocolMessages, CatalogueRoundTripAndRules)
              R"({"v":1,"variables":[{"path":"a","type":3},{"path":"a","type":2}]})",
              R"({"v":1,"variables":[{"path":"a","type":65536}]})",
              R"({"v":1,"variables":[{"path":"a","type":3,"kind":16}]})",
+             R"({"v":1,"variables":[{"path":"a","type":3,"valued":1}]})",
+             R"({"v":1,"variables":[{"path":"a","type":3,"valued":"true"}]})",
              R"({"v":1,"variables":[],"alarms":[{"id":""}]})",
              R"({"v":1,"variables":[],"alarms":[{"id":"x","severity":1001}]})",
          }) {

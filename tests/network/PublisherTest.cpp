@@ -116,6 +116,56 @@ TEST_F(PublisherTest, PublishesCatalogueValuesAndStateRetained)
     }));
 }
 
+/// Whether the catalogue in `payload` calls `path` valued; false when it does not list it.
+bool ListsValued(const std::string& payload, const std::string& path)
+{
+    for (const proto::CatalogueVariable& variable : proto::DecodeCatalogue(payload).variables) {
+        if (variable.path == path)
+            return variable.valued;
+    }
+    return false;
+}
+
+TEST_F(PublisherTest, CatalogueCallsAVariableValuedOnlyOnceTheBrokerHasItsValue)
+{
+    Publisher publisher("plant", On(broker));
+    publisher.DeclareVariable("level", TypeCode::Numeric, 0, proto::Access::Read);
+    publisher.DeclareVariable("flow", TypeCode::Numeric, 0, proto::Access::Read);
+    publisher.Publish("level", VarData::MakeNumeric(1.0)); // recorded before the connection
+    publisher.Start();
+
+    test::MqttObserver observer(broker.Port(), {"orvek/v1/#"});
+    const std::string catalogueTopic = Topic("plant", proto::TopicKind::Catalogue);
+    const std::string flowTopic = Topic("plant", proto::TopicKind::Value, "flow");
+    ASSERT_TRUE(observer.WaitFor(Topic("plant", proto::TopicKind::State),
+                                 [](const std::string& p) { return HasState(p, proto::RunState::Running); }));
+    const auto retained = observer.Get(catalogueTopic);
+    ASSERT_TRUE(retained);
+    EXPECT_TRUE(ListsValued(*retained, "level"));
+    EXPECT_FALSE(ListsValued(*retained, "flow"));
+
+    // The first value goes out ahead of the catalogue that calls the variable
+    // valued, so whoever sees that catalogue already has the value.
+    publisher.Publish("flow", VarData::MakeNumeric(2.0));
+    ASSERT_TRUE(observer.WaitFor(catalogueTopic, [](const std::string& p) { return ListsValued(p, "flow"); }));
+    const auto flow = observer.Get(flowTopic);
+    ASSERT_TRUE(flow);
+    EXPECT_EQ(proto::DecodeValueMessage(*flow).value.ToDouble(), 2.0);
+    // A later value leaves the catalogue alone.
+    const std::size_t catalogues = observer.Count(catalogueTopic);
+    publisher.Publish("flow", VarData::MakeNumeric(3.0));
+
+    // Another type drops the value: the catalogue stops calling the variable
+    // valued before its topic is emptied.
+    publisher.DeclareVariable("flow", TypeCode::AnsiString, 0, proto::Access::Read);
+    ASSERT_TRUE(observer.WaitFor(flowTopic, [](const std::string& p) { return p.empty(); }));
+    EXPECT_EQ(observer.Count(catalogueTopic), catalogues + 1);
+    const auto after = observer.Get(catalogueTopic);
+    ASSERT_TRUE(after);
+    EXPECT_FALSE(ListsValued(*after, "flow"));
+    EXPECT_TRUE(ListsValued(*after, "level"));
+}
+
 TEST_F(PublisherTest, RefusesMisuseAndUnreachableServer)
 {
     Publisher publisher("p", On(broker));

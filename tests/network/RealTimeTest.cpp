@@ -341,6 +341,72 @@ TEST_F(RealTimeTest, AccessDeniedForAnUnreadableVariableAndARefusedLogin)
     EXPECT_EQ(refused->error, rt::ErrorCodes::AccessDenied);
 }
 
+TEST_F(RealTimeTest, AValuedVariableWhoseValueIsWithheldIsAccessDenied)
+{
+    // "viewer" may read everything of "boiler" but the value of "secret".
+    StartBroker({{{"plant", "p"}, {"viewer", "v"}},
+                 "user plant\ntopic readwrite orvek/v1/#\n"
+                 "user viewer\ntopic read orvek/v1/boiler/state\ntopic read orvek/v1/boiler/catalogue\n"
+                 "topic read orvek/v1/boiler/value/open\n",
+                 true, ""});
+    FakeProcess process(broker_->Port(), "boiler", "plant", "p");
+    proto::Catalogue catalogue;
+    catalogue.variables.push_back({"secret", 3, 0, proto::Access::Read, true});
+    catalogue.variables.push_back({"unset", 3, 0, proto::Access::Read, false});
+    catalogue.variables.push_back({"open", 3, 0, proto::Access::Read, true});
+    process.Value("secret", 1.0);
+    process.Value("open", 2.0);
+    process.Client().Publish(proto::ProcessTopic("boiler", proto::TopicKind::Catalogue),
+                             proto::EncodeCatalogue(catalogue));
+    process.State(proto::RunState::Running);
+
+    RealTime(); // makes the session that the subscriptions' connection uses
+    ASSERT_EQ(session_->Login(u"viewer", u"v", nullptr), network::session::kStatusOk);
+    Subscribe(u"\\\\localhost\\boiler\\secret", 1);
+    Subscribe(u"\\\\localhost\\boiler\\unset", 2);
+    Subscribe(u"\\\\localhost\\boiler\\open", 3);
+
+    const auto withheld = receiver_.WaitFor(1, Settled);
+    ASSERT_TRUE(withheld);
+    EXPECT_EQ(withheld->quality, Q::AccessDenied);
+    EXPECT_EQ(withheld->error, rt::ErrorCodes::AccessDenied);
+    EXPECT_EQ(withheld->data.Code(), value::TypeCode::Empty);
+    // Never published: nothing is withheld.
+    const auto unset = receiver_.WaitFor(2, Settled);
+    ASSERT_TRUE(unset);
+    EXPECT_EQ(unset->quality, Q::NoKnownValue);
+    const auto open = receiver_.WaitFor(3, Settled);
+    ASSERT_TRUE(open);
+    EXPECT_EQ(open->quality, 0u);
+    EXPECT_EQ(open->data.ToDouble(), 2.0);
+
+    // A catalogue that later calls the variable valued, with its value
+    // still not delivered, turns "no known value" into "access denied".
+    catalogue.variables[1].valued = true;
+    process.Value("unset", 3.0);
+    process.Client().Publish(proto::ProcessTopic("boiler", proto::TopicKind::Catalogue),
+                             proto::EncodeCatalogue(catalogue));
+    EXPECT_TRUE(receiver_.WaitForQuality(2, Q::AccessDenied));
+}
+
+TEST_F(RealTimeTest, AValueArrivingForAValuedVariableClearsAccessDenied)
+{
+    FakeProcess process(broker_->Port());
+    proto::Catalogue catalogue;
+    catalogue.variables.push_back({"drum.level", 3, 0, proto::Access::Read, true});
+    process.Client().Publish(proto::ProcessTopic("boiler", proto::TopicKind::Catalogue),
+                             proto::EncodeCatalogue(catalogue));
+    process.State(proto::RunState::Running);
+    Subscribe(u"\\\\localhost\\boiler\\drum.level", 1);
+    ASSERT_TRUE(receiver_.WaitForQuality(1, Q::AccessDenied));
+
+    process.Value("drum.level", 4.0);
+    const auto shown = receiver_.WaitFor(1, [](const auto& c) { return c.quality == 0; });
+    ASSERT_TRUE(shown);
+    EXPECT_EQ(shown->error, 0);
+    EXPECT_EQ(shown->data.ToDouble(), 4.0);
+}
+
 TEST_F(RealTimeTest, WriteSendsARequestAndReleaseStopsDeliveries)
 {
     FakeProcess process(broker_->Port());
