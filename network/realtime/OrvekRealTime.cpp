@@ -14,6 +14,7 @@
 #include <optional>
 #include <thread>
 #include <utility>
+#include <vector>
 
 namespace qv::network::realtime {
 namespace {
@@ -113,6 +114,14 @@ public:
     ~RealTime() override
     {
         receiver_->Close();
+        // The reporters hold the receiver; they end before it may be released.
+        std::vector<std::thread> reporters;
+        {
+            std::lock_guard lock(mutex_);
+            reporters.swap(reporters_);
+        }
+        for (std::thread& reporter : reporters)
+            reporter.join();
         std::map<std::pair<std::string, std::uint16_t>, std::shared_ptr<Connection>> connections;
         {
             std::lock_guard lock(mutex_);
@@ -184,16 +193,19 @@ private:
     /// thread of the library as every change is.
     void ReportInvalidURL(std::int32_t handle)
     {
-        std::thread([receiver = receiver_, handle] {
+        std::lock_guard lock(mutex_);
+        reporters_.emplace_back([receiver = receiver_, handle] {
             receiver->Deliver(handle, ChangeMask::All, value::VarData(), QualityBits::InvalidURL,
                               ErrorCodes::InvalidURL, CurrentTime());
-        }).detach();
+        });
     }
 
     session::IOrvekSession* session_;
     std::shared_ptr<ReceiverLink> receiver_;
     std::mutex mutex_;
     std::map<std::pair<std::string, std::uint16_t>, std::shared_ptr<Connection>> connections_;
+    /// Threads that report invalid URLs, joined when the object goes.
+    std::vector<std::thread> reporters_;
 };
 
 } // namespace
