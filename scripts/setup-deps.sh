@@ -9,6 +9,7 @@ packages=(
   tzdata
   mosquitto
   nlohmann-json3-dev libmosquitto-dev mosquitto-clients
+  libboost-dev
   "$@"
 )
 

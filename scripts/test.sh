@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Installs what is missing, builds, and runs every test: the normal build,
-# then the base library's tests again under AddressSanitizer and
-# UndefinedBehaviorSanitizer.
+# then every test again under AddressSanitizer and UndefinedBehaviorSanitizer,
+# then the concurrency tests (label "concurrency") under ThreadSanitizer.
 set -euo pipefail
 root="$(cd "$(dirname "$0")/.." && pwd)"
 cd "$root"
@@ -13,3 +13,8 @@ ctest --test-dir build --output-on-failure -j"$(nproc)"
 
 scripts/build.sh build-asan -DVAROSCOPE_BENCH=OFF -DVAROSCOPE_SANITIZE=address,undefined
 ctest --test-dir build-asan --output-on-failure -j"$(nproc)"
+
+# Only the programs that hold concurrency tests are built with ThreadSanitizer.
+cmake -S . -B build-tsan -DCMAKE_BUILD_TYPE=RelWithDebInfo -DVAROSCOPE_BENCH=OFF -DVAROSCOPE_SANITIZE=thread >/dev/null
+cmake --build build-tsan -j"$(nproc)" --target client_tests
+ctest --test-dir build-tsan -L concurrency --output-on-failure -j"$(nproc)"
