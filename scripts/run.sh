@@ -1,9 +1,10 @@
 #!/usr/bin/env bash
 # Installs what is missing, builds, and runs the demo network: this host's
 # services (the data server among them), the orvek-sim demo plant, and
-# orvek-sub watching a few of its variables live until Ctrl+C. Until the
-# monitor window exists, this is the way to see the network at work.
-# With arguments, orvek-sub watches those item URLs instead.
+# varoscope-watch showing the shipped demo watch list live until Ctrl+C.
+# Until the monitor window exists, this is the way to see the network at
+# work. Arguments go to varoscope-watch instead of the demo list (a .vsd
+# file, item URLs, options; see varoscope-watch --help).
 set -euo pipefail
 root="$(cd "$(dirname "$0")/.." && pwd)"
 cd "$root"
@@ -17,9 +18,6 @@ sim=$!
 trap 'kill -TERM $sim 2>/dev/null; wait $sim 2>/dev/null || true' EXIT
 
 if [ $# -eq 0 ]; then
-  set -- '\\localhost\boiler\drum.level' '\\localhost\boiler\drum.pressure' \
-         '\\localhost\boiler\status' '\\localhost\tanks\levels' \
-         '\\localhost\tanks\product.name' '\\localhost\packaging\count.total' \
-         '\\localhost\packaging\line.running'
+  set -- --digits 6 resources/demo/plant.vsd
 fi
-build/bin/orvek-sub "$@"
+build/bin/varoscope-watch "$@"

@@ -2,89 +2,13 @@
 // orvek-sim as a child process of a test. ORVEK_SIM_PROGRAM, the path of the
 // program, comes from the build.
 
-#include <cerrno>
-#include <chrono>
-#include <csignal>
-#include <stdexcept>
-#include <string>
-#include <sys/wait.h>
-#include <thread>
-#include <unistd.h>
-#include <vector>
+#include "support/ChildProcess.h"
 
 namespace qv::test {
 
-/// orvek-sim as a child process whose standard output is collected; killed
-/// if it is still running when the object goes.
-class Simulator {
+class Simulator : public ChildProcess {
 public:
-    explicit Simulator(std::vector<std::string> arguments)
-    {
-        int pipeEnds[2];
-        if (pipe(pipeEnds) != 0)
-            throw std::runtime_error("pipe failed");
-        arguments.insert(arguments.begin(), ORVEK_SIM_PROGRAM);
-        // Built before fork: the child of a threaded test may only exec.
-        std::vector<char*> argv;
-        for (auto& argument : arguments)
-            argv.push_back(argument.data());
-        argv.push_back(nullptr);
-        pid_ = fork();
-        if (pid_ == 0) {
-            dup2(pipeEnds[1], STDOUT_FILENO);
-            close(pipeEnds[0]);
-            close(pipeEnds[1]);
-            execv(argv[0], argv.data());
-            _exit(127);
-        }
-        close(pipeEnds[1]);
-        output_ = pipeEnds[0];
-    }
-    ~Simulator()
-    {
-        if (pid_ > 0) {
-            kill(pid_, SIGKILL);
-            waitpid(pid_, nullptr, 0);
-        }
-        close(output_);
-    }
-
-    void Signal(int signal) { kill(pid_, signal); }
-
-    /// The exit code once the program ends within `timeout`; -1 otherwise
-    /// (it is killed then) or when a signal ended it.
-    int Wait(std::chrono::milliseconds timeout)
-    {
-        const auto deadline = std::chrono::steady_clock::now() + timeout;
-        int status = 0;
-        while (waitpid(pid_, &status, WNOHANG) == 0) {
-            if (std::chrono::steady_clock::now() > deadline) {
-                kill(pid_, SIGKILL);
-                waitpid(pid_, &status, 0);
-                pid_ = -1;
-                return -1;
-            }
-            std::this_thread::sleep_for(std::chrono::milliseconds(20));
-        }
-        pid_ = -1;
-        return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-    }
-
-    /// Everything the program wrote to its standard output (after Wait).
-    std::string Output()
-    {
-        std::string text;
-        char buffer[4096];
-        ssize_t count;
-        while ((count = read(output_, buffer, sizeof buffer)) > 0 || (count < 0 && errno == EINTR))
-            if (count > 0)
-                text.append(buffer, static_cast<std::size_t>(count));
-        return text;
-    }
-
-private:
-    pid_t pid_ = -1;
-    int output_ = -1;
+    explicit Simulator(std::vector<std::string> arguments) : ChildProcess(ORVEK_SIM_PROGRAM, std::move(arguments)) {}
 };
 
 } // namespace qv::test
