@@ -155,6 +155,10 @@ struct Publisher::Impl {
 
     void SendCatalogue()
     {
+        // Not built while unconnected: the connection sends it once anyway,
+        // and building it per declaration made declaring n variables O(n²).
+        if (!connected)
+            return;
         proto::Catalogue catalogue;
         for (const auto& [path, variable] : variables)
             catalogue.variables.push_back({path, variable.type, variable.kind, variable.access, variable.hasValue});
