@@ -11,6 +11,7 @@
 #include <array>
 #include <cerrno>
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <filesystem>
 #include <unistd.h>
 
@@ -23,6 +24,10 @@ constexpr std::array<std::int32_t WindowPlacement::*, 11> kPlacementFields = {
     &WindowPlacement::minimizedX,   &WindowPlacement::minimizedY,  &WindowPlacement::maximizedX,
     &WindowPlacement::maximizedY,   &WindowPlacement::normalBottom, &WindowPlacement::normalRight,
     &WindowPlacement::normalLeft,   &WindowPlacement::normalTop};
+
+/// Far beyond any watch list (100,000 items of 300-character URLs take
+/// about 31 MiB).
+constexpr off_t kLargestDocumentFile = 64 << 20;
 
 /// Closes a descriptor on every way out.
 struct FileDescriptor {
@@ -110,9 +115,18 @@ DocumentContents LoadDocument(const std::string& path)
 
 std::string ReadWholeFile(const std::string& path)
 {
-    const FileDescriptor file{::open(path.c_str(), O_RDONLY | O_CLOEXEC)};
+    const FileDescriptor file{::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK)};
     if (file.fd < 0)
         ThrowErrno("open", path, errno);
+    // Only a regular file of sane size: a device or a pipe given as a
+    // document would never end or exhaust memory.
+    struct stat status {};
+    if (::fstat(file.fd, &status) != 0)
+        ThrowErrno("read", path, errno);
+    if (!S_ISREG(status.st_mode))
+        ThrowErrno("read", path, EINVAL);
+    if (status.st_size > kLargestDocumentFile)
+        ThrowErrno("read", path, EFBIG);
     std::string bytes;
     char buffer[65536];
     for (;;) {
@@ -123,6 +137,8 @@ std::string ReadWholeFile(const std::string& path)
             ThrowErrno("read", path, errno);
         if (n > 0)
             bytes.append(buffer, static_cast<std::size_t>(n));
+        if (bytes.size() > static_cast<std::size_t>(kLargestDocumentFile))
+            ThrowErrno("read", path, EFBIG);
     }
 }
 

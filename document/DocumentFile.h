@@ -82,7 +82,8 @@ void SaveDocument(const std::string& path, std::span<const ItemDataPacket> rows,
 DocumentContents LoadDocument(const std::string& path);
 
 /// The whole contents of the file `path`; a file that cannot be opened or
-/// read throws WinError naming the path and the system's reason.
+/// read, that is not a regular file, or that is larger than 64 MiB throws
+/// WinError naming the path and the reason.
 std::string ReadWholeFile(const std::string& path);
 
 /// The title of a document read from `path`: its file name without the

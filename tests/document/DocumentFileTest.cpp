@@ -148,6 +148,7 @@ TEST(DocumentFile, SavesAtomicallyAndLoadsBack)
         EXPECT_NE(std::string(e.what()).find("watch.vsd.missing"), std::string::npos) << e.what();
     }
     EXPECT_THROW(LoadDocument(home.Home().string()), qv::fen::osdep::WinError);
+    EXPECT_THROW(LoadDocument("/dev/zero"), qv::fen::osdep::WinError) << "a device never ends";
 }
 
 TEST(DocumentFile, TitleIsTheFileNameWithoutDirectoryAndExtension)
