@@ -151,7 +151,6 @@ int main(int argc, char** argv)
             ++pending;
             posted.notify_one();
         });
-        doc.AddView(&view);
         doc.OpenDocument(path);
         opened = Seconds(Clock::now() - start);
 

@@ -102,6 +102,11 @@ void OrvekClient::Unsubscribe(std::int32_t handle)
     receiver->RemoveSubscription(handle);
 }
 
+bool OrvekClient::IsSubscribed(std::int32_t handle) const
+{
+    return receiver->HasSubscription(handle);
+}
+
 void OrvekClient::UnsubscribeAll()
 {
     receiver->ReleaseAll();

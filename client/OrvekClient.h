@@ -65,6 +65,8 @@ public:
     void Unsubscribe(std::int32_t handle);
     /// Ends every subscription.
     void UnsubscribeAll();
+    /// Whether a subscription is held under `handle`.
+    bool IsSubscribed(std::int32_t handle) const;
 
     /// The session, for callers that hand it on (the network browser).
     network::session::IOrvekSession* GetSession() const noexcept { return session; }

@@ -2,8 +2,8 @@
 /// \file
 /// What the monitor document needs of its views. The windows implement
 /// these; so do the command-line watcher and the tests. The document calls
-/// every view on the user-interface thread, except DataView::Changes, which
-/// the data callback uses on library threads.
+/// every view on the user-interface thread only; library threads reach a
+/// data view's change queue alone, which the document holds a share of.
 
 #include "client/ChangeQueue.h"
 #include "document/DisplayOptions.h"
@@ -37,7 +37,12 @@ using UpdateHint = std::variant<const ItemBatch*, const RemovalList*>;
 class DataView {
 public:
     /// The queue the document's data callback appends to, from any thread.
-    virtual fbfen::orvekclient::ChangeQueue& Changes() = 0;
+    /// The document keeps a share of it while the view is registered, and
+    /// a change under way may still reach it a little after that: its
+    /// notifier must stay safe to call once the view is gone.
+    virtual fbfen::orvekclient::ChangeQueuePtr Changes() = 0;
+    /// Whether a row of the list holds `handle`.
+    virtual bool HoldsHandle(std::int32_t handle) = 0;
     /// Empties the list; true only on the first call in the view's life.
     virtual bool RemoveAll() = 0;
     /// Takes out of `batch` what the list already holds (rewriting

@@ -36,11 +36,23 @@ CMonitorDoc::~CMonitorDoc()
 void CMonitorDoc::AddView(DocumentView* view)
 {
     views.push_back(view);
+    PublishQueues();
 }
 
 void CMonitorDoc::RemoveView(DocumentView* view)
 {
     std::erase(views, view);
+    PublishQueues();
+}
+
+void CMonitorDoc::PublishQueues()
+{
+    auto queues = std::make_shared<QueueList>();
+    for (DocumentView* view : views)
+        if (DataView* dataView = view->AsDataView())
+            queues->push_back(dataView->Changes());
+    std::lock_guard guard(dataQueuesLock);
+    dataQueues = std::move(queues);
 }
 
 DataView* CMonitorDoc::GetDataView() const
@@ -53,6 +65,7 @@ DataView* CMonitorDoc::GetDataView() const
 
 bool CMonitorDoc::OnNewDocument()
 {
+    title = kUntitled;
     DataView* firstCleared = nullptr;
     for (DocumentView* view : views) {
         if (DataView* dataView = view->AsDataView()) {
@@ -135,15 +148,16 @@ void CMonitorDoc::AutoLoad()
     DataView* dataView = GetDataView();
     if (dataView == nullptr)
         return;
-    dataView->SetOptions(ReadOptionsFile(OptionsFilePath()));
-    if (!dataView->Options().autoloadLastView)
-        return;
     try {
+        dataView->SetOptions(ReadOptionsFile(OptionsFilePath()));
+        if (!dataView->Options().autoloadLastView)
+            return;
         const std::string path = AutoLoadFilePath();
         DocumentContents contents = LoadDocument(path);
         LoadContents(contents, path);
     } catch (const std::exception&) {
-        // A missing or damaged auto-load file starts an empty list.
+        // No configuration directory, or a missing or damaged auto-load
+        // file: the list starts with what was loaded so far.
     }
 }
 
@@ -155,6 +169,8 @@ std::int32_t CMonitorDoc::SubscribeItem(const fen::WString& url)
         callbacksInstalled = true;
     }
     const fen::OrvekURL parsed(url); // a syntax error reaches the caller
+    for (int tries = 0; tries < kLastHandle && IsHandleHeld(nextHandle); ++tries)
+        nextHandle = nextHandle == kLastHandle ? 1 : nextHandle + 1;
     const std::int32_t handle = nextHandle;
     try {
         client->Subscribe(handle, parsed, 0, 0);
@@ -163,6 +179,16 @@ std::int32_t CMonitorDoc::SubscribeItem(const fen::WString& url)
     }
     nextHandle = handle == kLastHandle ? 1 : handle + 1;
     return handle;
+}
+
+bool CMonitorDoc::IsHandleHeld(std::int32_t handle) const
+{
+    if (client->IsSubscribed(handle))
+        return true;
+    for (DocumentView* view : views)
+        if (DataView* dataView = view->AsDataView(); dataView != nullptr && dataView->HoldsHandle(handle))
+            return true;
+    return false;
 }
 
 void CMonitorDoc::SetNextHandleForTesting(std::int32_t handle)
@@ -190,9 +216,13 @@ void CMonitorDoc::DataChangeCallback(void* context, std::int32_t handle, std::ui
 
 void CMonitorDoc::DispatchDataChange(const DataChangePacket& packet)
 {
-    for (DocumentView* view : views)
-        if (DataView* dataView = view->AsDataView())
-            dataView->Changes().Deliver(packet);
+    std::shared_ptr<const QueueList> queues;
+    {
+        std::lock_guard guard(dataQueuesLock);
+        queues = dataQueues;
+    }
+    for (const auto& queue : *queues)
+        queue->Deliver(packet);
 }
 
 void CMonitorDoc::Login(fen::WString user, fen::WString password, fen::WString domain)

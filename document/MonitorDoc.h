@@ -7,8 +7,10 @@
 ///
 /// Threads: everything runs on the user-interface thread except the data
 /// callback, which runs on library threads and only appends to the data
-/// views' change queues. Views are added before the first subscription and
-/// stay until the document goes.
+/// views' change queues. It reads them from a snapshot that holds a share
+/// of each queue, so views may come and go while changes arrive; the
+/// snapshot's lock is held only to copy it, and no other lock is taken
+/// under it.
 
 #include "client/DataChangePacket.h"
 #include "document/DocumentViews.h"
@@ -17,6 +19,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <mutex>
 #include <string>
 #include <vector>
 
@@ -40,7 +43,8 @@ public:
     /// Ends every subscription, then closes the connection.
     ~CMonitorDoc();
 
-    /// Views in creation order: browser, data view, alarm view. Not owned.
+    /// Views in creation order: browser, data view, alarm view. Not owned;
+    /// a view removes itself before it goes.
     void AddView(DocumentView* view);
     void RemoveView(DocumentView* view);
     const std::vector<DocumentView*>& Views() const noexcept { return views; }
@@ -69,6 +73,8 @@ public:
     /// Subscribes `url` and returns its handle. A URL the grammar rejects
     /// throws SyntaxError and issues no handle; a subscription the client
     /// refuses still uses up its handle, whose item then receives nothing.
+    /// After the wrap, handles that a subscription or a row still holds are
+    /// passed over, so that two items never share one.
     std::int32_t SubscribeItem(const fen::WString& url);
     /// Ends the subscription of `handle`.
     void UnsubscribeItem(std::int32_t handle);
@@ -102,6 +108,8 @@ public:
     void DispatchDataChange(const fbfen::orvekclient::DataChangePacket& packet);
 
 private:
+    void PublishQueues();
+    bool IsHandleHeld(std::int32_t handle) const;
     static void DataChangeCallback(void* context, std::int32_t handle, std::uint32_t changeMask,
                                    const value::VarData* value, std::uint64_t quality, std::int32_t errorCode,
                                    fen::AbsTime timestamp);
@@ -112,6 +120,10 @@ private:
     bool callbacksInstalled = false;
     std::string userName = "(nobody)";
     std::vector<DocumentView*> views;
+    /// The data views' queues, as the data callback reads them.
+    using QueueList = std::vector<fbfen::orvekclient::ChangeQueuePtr>;
+    std::shared_ptr<const QueueList> dataQueues = std::make_shared<const QueueList>();
+    mutable std::mutex dataQueuesLock;
     bool modified = false;
     std::string title = kUntitled;
 };

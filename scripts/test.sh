@@ -16,5 +16,5 @@ ctest --test-dir build-asan --output-on-failure -j"$(nproc)"
 
 # Only the programs that hold concurrency tests are built with ThreadSanitizer.
 cmake -S . -B build-tsan -DCMAKE_BUILD_TYPE=RelWithDebInfo -DVAROSCOPE_BENCH=OFF -DVAROSCOPE_SANITIZE=thread >/dev/null
-cmake --build build-tsan -j"$(nproc)" --target client_tests watchlist_tests
+cmake --build build-tsan -j"$(nproc)" --target client_tests document_tests watchlist_tests
 ctest --test-dir build-tsan -L concurrency --output-on-failure -j"$(nproc)"

@@ -4,13 +4,19 @@
 #include "network/RealTimeTestSupport.h"
 
 #include "document/DropDecoding.h"
+#include "client/OrvekClient.h"
 #include "document/MonitorDoc.h"
 #include "document/OptionsFile.h"
 #include "fen/SyntaxError.h"
 
 #include <gtest/gtest.h>
 
+#include <boost/make_shared.hpp>
+
+#include <atomic>
 #include <fstream>
+#include <thread>
+#include <set>
 
 namespace qv::test {
 namespace {
@@ -21,7 +27,8 @@ class FakeDataView final : public DocumentView, public DataView {
 public:
     explicit FakeDataView(CMonitorDoc& document) : document_(document) {}
     DataView* AsDataView() override { return this; }
-    fbfen::orvekclient::ChangeQueue& Changes() override { return queue; }
+    fbfen::orvekclient::ChangeQueuePtr Changes() override { return queue; }
+    bool HoldsHandle(std::int32_t handle) override { return handles.contains(handle); }
     bool RemoveAll() override
     {
         log.push_back("RemoveAll");
@@ -45,7 +52,8 @@ public:
     DisplayOptions Options() override { return options; }
     void SetOptions(const DisplayOptions& o) override { options = o; }
 
-    fbfen::orvekclient::ChangeQueue queue{nullptr};
+    fbfen::orvekclient::ChangeQueuePtr queue = boost::make_shared<fbfen::orvekclient::ChangeQueue>(nullptr);
+    std::set<std::int32_t> handles;
     ItemBatch rows;
     std::optional<WindowPlacement> placement;
     DisplayOptions options;
@@ -91,6 +99,7 @@ protected:
 
 TEST_F(MonitorDocTest, IssuesHandlesInTurnWrapsAfterTheLastAndChargesRefusedItems)
 {
+    document_.AddView(&dataView_);
     CMonitorDoc::SetNextHandleForTesting(1);
     EXPECT_EQ(document_.SubscribeItem(fen::WString(u"\\\\localhost\\p\\a")), 1);
     EXPECT_EQ(document_.SubscribeItem(fen::WString(u"\\\\localhost\\p\\a")), 2);
@@ -100,7 +109,15 @@ TEST_F(MonitorDocTest, IssuesHandlesInTurnWrapsAfterTheLastAndChargesRefusedItem
     EXPECT_THROW(document_.SubscribeItem(fen::WString(u"\\\\h\\'open")), fen::exception::SyntaxError);
     CMonitorDoc::SetNextHandleForTesting(CMonitorDoc::kLastHandle);
     EXPECT_EQ(document_.SubscribeItem(fen::WString(u"\\\\localhost\\p\\b")), CMonitorDoc::kLastHandle);
-    EXPECT_EQ(document_.SubscribeItem(fen::WString(u"\\\\localhost\\p\\c")), 1);
+    // After the wrap, handles still held are passed over: 1 and 2 by
+    // subscriptions, 3 by a row whose subscription was refused.
+    dataView_.handles = {3};
+    EXPECT_EQ(document_.SubscribeItem(fen::WString(u"\\\\localhost\\p\\c")), 4);
+    document_.GetClient()->Unsubscribe(1);
+    CMonitorDoc::SetNextHandleForTesting(CMonitorDoc::kLastHandle - 1);
+    EXPECT_EQ(document_.SubscribeItem(fen::WString(u"\\\\localhost\\p\\d")), CMonitorDoc::kLastHandle - 1);
+    EXPECT_EQ(document_.SubscribeItem(fen::WString(u"\\\\localhost\\p\\e")), 1);
+    document_.RemoveView(&dataView_);
 }
 
 TEST_F(MonitorDocTest, EveryDataViewGetsItsOwnCopyOfEachChange)
@@ -114,9 +131,38 @@ TEST_F(MonitorDocTest, EveryDataViewGetsItsOwnCopyOfEachChange)
     packet.value = value::VarData("level");
     document_.DispatchDataChange(packet);
     for (FakeDataView* view : {&dataView_, &second}) {
-        ASSERT_EQ(view->queue.Size(), 1u);
-        view->queue.ApplyNext([](const auto& p) { EXPECT_EQ(p.handle, 7); });
+        ASSERT_EQ(view->queue->Size(), 1u);
+        view->queue->ApplyNext([](const auto& p) { EXPECT_EQ(p.handle, 7); });
     }
+    // A view that went gets nothing more.
+    document_.RemoveView(&second);
+    document_.DispatchDataChange(packet);
+    EXPECT_EQ(dataView_.queue->Size(), 1u);
+    EXPECT_EQ(second.queue->Size(), 0u);
+}
+
+TEST_F(MonitorDocTest, DataViewsComeAndGoWhileChangesArrive)
+{
+    // A library thread dispatches all along; the view that stays receives
+    // every change in order, and a view that goes is never touched after.
+    document_.AddView(&dataView_);
+    std::atomic<bool> done{false};
+    std::thread library([&] {
+        fbfen::orvekclient::DataChangePacket packet;
+        for (packet.handle = 0; packet.handle < 20000; ++packet.handle)
+            document_.DispatchDataChange(packet);
+        done = true;
+    });
+    while (!done) {
+        auto passing = std::make_unique<FakeDataView>(document_);
+        document_.AddView(passing.get());
+        document_.RemoveView(passing.get());
+    }
+    library.join();
+    std::int32_t expected = 0;
+    while (dataView_.queue->ApplyNext([&](const auto& p) { EXPECT_EQ(p.handle, expected); }))
+        ++expected;
+    EXPECT_EQ(expected, 20000);
 }
 
 TEST_F(MonitorDocTest, ReportsTheSessionsUserOnceLoggedIn)
@@ -150,6 +196,7 @@ TEST_F(MonitorDocTest, FirstNewDocumentAutoLoadsAndLaterOnesDoNot)
     EXPECT_TRUE(document_.OnNewDocument());
     EXPECT_TRUE(dataView_.rows.empty()) << "File > New empties the list and loads nothing";
     EXPECT_FALSE(document_.IsModified());
+    EXPECT_EQ(document_.GetTitle(), CMonitorDoc::kUntitled);
     EXPECT_EQ(alarmView_.forgotten, 2);
 }
 

@@ -111,7 +111,6 @@ int Run(const qv::tools::WatchCommandLine& line)
     qv::document::ItemBatch typed = RecordsFor(line.urls); // bad URLs stop us before anything starts
     auto document = std::make_unique<CMonitorDoc>(line.ensureServices);
     auto view = std::make_unique<DocumentDataView>(*document, PostChange);
-    document->AddView(view.get());
     WatchList& list = view->List();
 
     if (line.documentPath.empty() && line.urls.empty()) {
@@ -147,9 +146,6 @@ int Run(const qv::tools::WatchCommandLine& line)
         }
     }
     view->Shutdown(false);
-    // The connection goes first: a change still under way may reach the
-    // view's queue until then.
-    document.reset();
     return status;
 }
 

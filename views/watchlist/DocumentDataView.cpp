@@ -7,6 +7,12 @@ namespace qv::views {
 DocumentDataView::DocumentDataView(document::CMonitorDoc& document, fbfen::orvekclient::ChangeQueue::Notifier notify)
     : document_(document), list_(*this, std::move(notify))
 {
+    document_.AddView(this);
+}
+
+DocumentDataView::~DocumentDataView()
+{
+    document_.RemoveView(this);
 }
 
 void DocumentDataView::Shutdown(bool autoSave)

@@ -19,9 +19,12 @@ namespace qv::views {
 
 class DocumentDataView final : public document::DocumentView, public document::DataView, private WatchListHost {
 public:
-    /// `notify` asks the owning thread to run ApplyNextChange once; it is
-    /// called on library threads, once per change.
+    /// Registers with `document`, which must outlive the view. `notify` asks
+    /// the owning thread to run ApplyNextChange once; it is called on library
+    /// threads, once per change, and a change under way may call it just
+    /// after the view is gone.
     DocumentDataView(document::CMonitorDoc& document, fbfen::orvekclient::ChangeQueue::Notifier notify);
+    ~DocumentDataView() override;
 
     WatchList& List() noexcept { return list_; }
 
@@ -33,7 +36,8 @@ public:
     document::DataView* AsDataView() override { return this; }
 
     // document::DataView
-    fbfen::orvekclient::ChangeQueue& Changes() override { return *list_.Queue(); }
+    fbfen::orvekclient::ChangeQueuePtr Changes() override { return list_.Queue(); }
+    bool HoldsHandle(std::int32_t handle) override { return list_.RowOf(handle).has_value(); }
     bool RemoveAll() override { return list_.RemoveAll(); }
     void FilterAndInsert(document::ItemBatch& batch) override;
     document::ItemBatch RowsToSave() override;
