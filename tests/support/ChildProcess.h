@@ -5,6 +5,8 @@
 #include <cerrno>
 #include <chrono>
 #include <csignal>
+#include <functional>
+#include <poll.h>
 #include <stdexcept>
 #include <string>
 #include <sys/wait.h>
@@ -70,7 +72,8 @@ public:
         return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
     }
 
-    /// Everything the program wrote to its standard output (after Wait).
+    /// Everything the program wrote to its standard output: what it wrote
+    /// after the latest ReadUntil (call after Wait).
     std::string Output()
     {
         std::string text;
@@ -79,6 +82,30 @@ public:
         while ((count = read(output_, buffer, sizeof buffer)) > 0 || (count < 0 && errno == EINTR))
             if (count > 0)
                 text.append(buffer, static_cast<std::size_t>(count));
+        return text;
+    }
+
+    /// Reads the output as it comes until `done(everything so far)` holds
+    /// or `timeout` passes; returns everything read.
+    std::string ReadUntil(const std::function<bool(const std::string&)>& done, std::chrono::milliseconds timeout)
+    {
+        const auto deadline = std::chrono::steady_clock::now() + timeout;
+        std::string text;
+        char buffer[4096];
+        while (!done(text)) {
+            const auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
+                deadline - std::chrono::steady_clock::now());
+            if (left.count() <= 0)
+                break;
+            pollfd ready{output_, POLLIN, 0};
+            if (poll(&ready, 1, static_cast<int>(left.count())) <= 0)
+                continue;
+            const ssize_t count = read(output_, buffer, sizeof buffer);
+            if (count == 0)
+                break; // the program ended
+            if (count > 0)
+                text.append(buffer, static_cast<std::size_t>(count));
+        }
         return text;
     }
 
