@@ -106,11 +106,11 @@ TEST_F(E2EAccess, WriteDeniedByTheAccessListLeavesTheValueUnchanged)
                  "user operator\ntopic readwrite orvek/v1/#\n"
                  "user viewer\ntopic read orvek/v1/#\n",
                  true, ""});
+    std::mutex mutex; // outlives the publisher, whose thread runs the handler
+    std::vector<WriteRequestInfo> requests;
     Publisher publisher("boiler", PublisherOn("plant", "p-secret"));
     publisher.DeclareVariable("setpoint", TypeCode::Numeric, 0, proto::Access::Read | proto::Access::Write);
     publisher.Publish("setpoint", VarData::MakeNumeric(50));
-    std::mutex mutex;
-    std::vector<WriteRequestInfo> requests;
     publisher.SetWriteHandler([&](const WriteRequestInfo& request, VarData&) {
         std::lock_guard lock(mutex);
         requests.push_back(request);

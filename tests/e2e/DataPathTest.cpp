@@ -8,7 +8,6 @@
 #include "network/protocol/Catalogue.h"
 #include "network/protocol/VarDataJson.h"
 
-#include <bit>
 #include <fstream>
 #include <limits>
 #include <mutex>
@@ -61,49 +60,34 @@ TEST_F(E2EData, EveryPublishedTypeReachesTheSubscriptionUnchanged)
     dictionary[VarData("list")].SetElement(2, VarData::MakeNumeric(7, 3));
     dictionary[VarData::MakeNumeric(-1)] = VarData(u"x");
     dictionary[VarData::MakeLogical(true)] = VarData::NewDictionary();
-    VarData vector;
-    vector.SetElement(0, VarData::MakeUInt64(~0ull));
-    vector.SetElement(2, VarData(fen::AbsTime{1ull << 63, -5}));
-    const VarData inner = vector;
-    vector.SetElement(3, inner);
+    VarData vector = VarData::MakeUInt64(~0ull);
+    vector.SetElement(2, dictionary); // a gap, then the dictionary
 
+    // Each type once, with the publisher's numeric kinds and sub-types; the
+    // edge values of each type are the codec's own tests.
     const struct {
         const char* name;
         VarData value;
     } cases[] = {
         {"empty", VarData()},
         {"null", VarData::MakeTyped(TypeCode::Null)},
-        {"break", VarData::MakeTyped(TypeCode::CairnetBreak)},
-        {"pulse", VarData::MakeTyped(TypeCode::LogicalPulse)},
         {"logical", VarData::MakeLogical(true)},
-        {"logical with sub-type", FromJson(R"({"t":327682,"b":false})")},
         {"float64", VarData::MakeNumeric(0.1)},
-        {"negative zero", VarData::MakeNumeric(-0.0)},
-        {"nan with payload", VarData::MakeNumeric(std::bit_cast<double>(std::uint64_t{0xFFF0000000000123}))},
-        {"-inf", VarData::MakeNumeric(-std::numeric_limits<double>::infinity())},
         {"int16", VarData::MakeNumeric(-5, 2)},
-        {"uint32", VarData::MakeNumeric(4294967295.0, 6)},
-        {"float32", VarData::MakeNumeric(1.5, 7)},
         {"bit field", VarData::MakeBitField(0xDEADBEEF)},
         {"time count", VarData::MakeTime(~0ull)},
         {"word32", FromJson(R"({"t":13,"w":4294967295})")},
         {"uint64 2^53+1", VarData::MakeUInt64(9007199254740993ull)},
         {"ansi", VarData("Gr\xC3\xBC\xC3\x9F" "e \"q\" \\ /")},
-        {"ansi not utf-8 with nul", VarData::MakeAnsi("\xFF\0\xC3", 3)},
         {"ansi with sub-type", FromJson(R"({"t":2147487749,"a":"abc"})")},
         {"unicode", VarData(u"\u20AC \U0001F600")},
-        {"unicode lone surrogate", VarData(fen::WString(u"a\xD800z", 3))},
         {"raw bytes", VarData(bytes, sizeof bytes)},
-        {"raw without storage", VarData(bytes, 0)},
         {"dictionary", dictionary},
-        {"dictionary empty", VarData::NewDictionary()},
-        {"dictionary without storage", VarData::MakeTyped(TypeCode::Dictionary)},
         {"time value", VarData(fen::AbsTime{~0ull, std::numeric_limits<std::int64_t>::max()})},
         {"time number", FromJson(R"({"t":4112,"s":"-1","f":"13835058055282163712"})")},
         {"foreign variant", VarData::MakeFBVariant(descriptor, 2, variantData, sizeof variantData)},
         {"flex", Wrapped(VarData::MakeNumeric(2.5, 2))},
         {"vector", vector},
-        {"vector without storage", VarData::MakeTyped(TypeCode::Vector)},
         {"unknown code", VarData::MakeTyped(0xABCD0077)},
     };
     constexpr std::size_t kCount = std::size(cases);
@@ -130,50 +114,31 @@ TEST_F(E2EData, EveryPublishedTypeReachesTheSubscriptionUnchanged)
         SCOPED_TRACE(cases[i].name);
         const auto change = monitor.Receiver().WaitFor(static_cast<std::int32_t>(i), Settled);
         ASSERT_TRUE(change);
-        EXPECT_EQ(change->data.TypeWord(), cases[i].value.TypeWord());
-        EXPECT_EQ(VarData::Compare(change->data, cases[i].value), 0);
-        EXPECT_EQ(change->value, Json(cases[i].value)); // every bit, element and byte
+        EXPECT_EQ(change->value, Json(cases[i].value)); // the type word and every bit, element and byte
         EXPECT_EQ(change->quality, quality(i));
         EXPECT_EQ(change->error, error(i));
         EXPECT_EQ(change->time, time(i));
     }
 }
 
-/// A process "boiler", not yet started, whose write handler records what it was asked.
-class Boiler {
-public:
-    explicit Boiler(network::publisher::PublisherOptions options) : publisher_("boiler", std::move(options))
-    {
-        publisher_.DeclareVariable("drum.level", TypeCode::Numeric, 0, proto::Access::Read);
-        publisher_.DeclareVariable("drum.level.setpoint", TypeCode::Numeric,
-                                   static_cast<std::uint8_t>(value::NumericKind::Float32),
-                                   proto::Access::Read | proto::Access::Write);
-        publisher_.Publish("drum.level", VarData::MakeNumeric(10));
-        publisher_.Publish("drum.level.setpoint", VarData::MakeNumeric(50));
-        publisher_.SetWriteHandler([this](const WriteRequestInfo& request, VarData&) {
-            std::lock_guard lock(mutex_);
-            requests_.push_back(request);
-            return WriteDecision{};
-        });
-    }
-    Publisher& Get() { return publisher_; }
-    std::vector<WriteRequestInfo> Requests()
-    {
-        std::lock_guard lock(mutex_);
-        return requests_;
-    }
-
-private:
-    Publisher publisher_;
-    std::mutex mutex_;
-    std::vector<WriteRequestInfo> requests_;
-};
-
 TEST_F(E2EData, WriteRoundTripsThroughTheOwningProcess)
 {
     StartBroker({{{"plant", "p-secret"}, {"operator", "o-secret"}}, "", true, ""});
-    Boiler boiler(PublisherOn("plant", "p-secret"));
-    Start(boiler.Get(), "plant", "p-secret");
+    std::mutex mutex; // outlives the publisher, whose thread runs the handler
+    std::vector<WriteRequestInfo> requests;
+    Publisher boiler("boiler", PublisherOn("plant", "p-secret"));
+    boiler.DeclareVariable("drum.level", TypeCode::Numeric, 0, proto::Access::Read);
+    boiler.DeclareVariable("drum.level.setpoint", TypeCode::Numeric,
+                           static_cast<std::uint8_t>(value::NumericKind::Float32),
+                           proto::Access::Read | proto::Access::Write);
+    boiler.Publish("drum.level", VarData::MakeNumeric(10));
+    boiler.Publish("drum.level.setpoint", VarData::MakeNumeric(50));
+    boiler.SetWriteHandler([&](const WriteRequestInfo& request, VarData&) {
+        std::lock_guard lock(mutex);
+        requests.push_back(request);
+        return WriteDecision{};
+    });
+    Start(boiler, "plant", "p-secret");
     Monitor monitor;
     ASSERT_EQ(monitor.Login(u"operator", u"o-secret"), network::session::kStatusOk);
     auto* level = monitor.Subscribe(u"\\\\localhost\\boiler\\drum.level", 1);
@@ -193,14 +158,14 @@ TEST_F(E2EData, WriteRoundTripsThroughTheOwningProcess)
     EXPECT_EQ(written->data.TypeWord(), 0x70003u); // the variable's kind, not the writer's
     EXPECT_EQ(written->data.ToDouble(), 61.25);
     EXPECT_EQ(written->quality, 0u);
-    EXPECT_EQ(boiler.Get().Value("drum.level.setpoint").ToDouble(), 61.25);
+    EXPECT_EQ(boiler.Value("drum.level.setpoint").ToDouble(), 61.25);
+    EXPECT_EQ(boiler.Value("drum.level").ToDouble(), 10.0);
+    EXPECT_EQ(monitor.Receiver().Changes(1).back().data.ToDouble(), 10.0);
 
-    const auto requests = boiler.Requests();
+    std::lock_guard lock(mutex);
     ASSERT_EQ(requests.size(), 1u);
     EXPECT_EQ(requests[0].path, "drum.level.setpoint");
     EXPECT_EQ(requests[0].user, "operator"); // the session's login goes with the request
-    EXPECT_EQ(boiler.Get().Value("drum.level").ToDouble(), 10.0);
-    EXPECT_EQ(monitor.Receiver().Changes(1).back().data.ToDouble(), 10.0);
 }
 
 /// The shell blocks (```sh) of the page's mosquitto_pub example that publish,
@@ -289,8 +254,6 @@ TEST_F(E2EData, DemoPlantIsSeenLive)
     Simulator sim({"--port", std::to_string(broker_->Port()), "--seconds", "8"});
     Monitor monitor;
     monitor.Subscribe(u"\\\\localhost\\boiler\\drum.level", 1);
-    monitor.Subscribe(u"\\\\localhost\\tanks\\levels", 2);
-    monitor.Subscribe(u"\\\\localhost\\packaging\\count.total", 3);
 
     // Values keep changing while the plant runs (a sensor failure now and
     // then only adds its quality bit).
@@ -305,10 +268,6 @@ TEST_F(E2EData, DemoPlantIsSeenLive)
             levels.insert(change->value);
     }
     EXPECT_GE(levels.size(), 3u);
-    const auto vector = monitor.Receiver().WaitFor(2, [](const auto& c) { return c.data.Code() == TypeCode::Vector; });
-    ASSERT_TRUE(vector);
-    EXPECT_GT(vector->data.Size(), 0u);
-    EXPECT_TRUE(monitor.Receiver().WaitFor(3, [](const auto& c) { return c.data.Code() == TypeCode::UInt64; }));
 
     // An orderly stop: the plant's values stay, marked as its process's failure to run.
     sim.Signal(SIGTERM);

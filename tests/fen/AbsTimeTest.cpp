@@ -27,7 +27,6 @@ TEST(AbsTime, ArithmeticCarriesBetweenHalves)
     EXPECT_LT((AbsTime{~std::uint64_t{0}, -1}), (AbsTime{0, 0}));
     EXPECT_LT((AbsTime{5, 3}), (AbsTime{0, 4}));
     EXPECT_LT(AbsTime::Earliest(), (AbsTime{0, -1}));
-    EXPECT_TRUE(AbsTime::Earliest().IsEarliest());
 }
 
 TEST(AbsTime, EpochsOfTheOperatingSystem)
@@ -37,11 +36,10 @@ TEST(AbsTime, EpochsOfTheOperatingSystem)
     EXPECT_EQ(ticks, kFileTimeEpochOffset * 10'000'000);
     ASSERT_EQ(AbsTimeToUnixSeconds(AbsTimeFromUnixSeconds(1'700'000'000), Rounding::Truncate, seconds), kTimeOk);
     EXPECT_EQ(seconds, 1'700'000'000);
-    EXPECT_EQ(AbsTimeFromUnixSeconds(0).seconds, kUnixEpochOffset);
     EXPECT_THROW(AbsTimeFromUnixSeconds(INT64_MAX), qv::fen::exception::OutOfRange);
 }
 
-TEST(AbsTime, RoundingTiesToEvenAndTruncationTowardThePast)
+TEST(AbsTime, RoundingTiesToEvenAndTruncationTowardThePastInEveryUnit)
 {
     // 2.5 s and 3.5 s tie; -0.5 s ties to 0 and truncates to -1.
     EXPECT_EQ(Count({kHalf, 2}, TimeUnit::Seconds, Rounding::NearestEven), 2);
@@ -54,10 +52,8 @@ TEST(AbsTime, RoundingTiesToEvenAndTruncationTowardThePast)
     EXPECT_EQ(Count({kHalf, 0}, TimeUnit::Milliseconds, Rounding::Truncate), 500);
     EXPECT_EQ(Count({1, 0}, TimeUnit::Attoseconds, Rounding::Truncate), 0);
     EXPECT_EQ(Count({~std::uint64_t{0}, 0}, TimeUnit::Attoseconds, Rounding::NearestEven), 1'000'000'000'000'000'000);
-}
 
-TEST(AbsTime, UnitsLongerThanASecond)
-{
+    // Units longer than a second: 1.5 and 2.5 min tie, just over 2.5 does not.
     EXPECT_EQ(Count({0, 90}, TimeUnit::Minutes, Rounding::NearestEven), 2);
     EXPECT_EQ(Count({0, 150}, TimeUnit::Minutes, Rounding::NearestEven), 2);
     EXPECT_EQ(Count({1, 150}, TimeUnit::Minutes, Rounding::NearestEven), 3);

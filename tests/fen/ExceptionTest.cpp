@@ -57,7 +57,6 @@ TEST(Exception, LocationIsStampedAtTheThrowSiteAndSharedByAddress)
         EXPECT_GT(e.GetLine(), 0);
         ASSERT_NE(e.GetFile(), nullptr);
         EXPECT_NE(std::strstr(e.GetFile(), "ExceptionTest.cpp"), nullptr);
-        EXPECT_STREQ(e.what(), "Out of range");
         firstFile = e.GetFile();
     }
     try {
@@ -84,15 +83,6 @@ TEST(Exception, TreeIsCaughtByItsBases)
     EXPECT_TRUE(caughtAsException([] { QV_THROW(SyntaxError()); }));
     EXPECT_FALSE(caughtAsException([] { throw TypeErrorException(); }));
     EXPECT_FALSE(caughtAsException([] { throw std::bad_alloc(); }));
-
-    // A specific handler placed before the general one takes its class.
-    try {
-        QV_THROW(WinError(2u));
-    } catch (const OSException& e) {
-        EXPECT_EQ(e.GetOSErrorCode(), 2u);
-    } catch (const Exception&) {
-        ADD_FAILURE() << "WinError must be caught as OSException first";
-    }
 }
 
 TEST(Exception, WinErrorStatusTable)
@@ -110,23 +100,13 @@ TEST(Exception, WinErrorStatusTable)
     EXPECT_EQ(OSException().GetErrorCode(), 42);
 }
 
-TEST(Exception, WinErrorTextComesFromTheSystemOrStaysUnknown)
+TEST(Exception, WinErrorTextComesFromTheSystemOrStaysUnknownAndDefaultsToErrno)
 {
-    WinError known(2u);
-    EXPECT_STREQ(known.what(), std::strerror(ENOENT));
-    EXPECT_EQ(known.GetOSErrorCode(), 2u);
-
-    WinError unknown(1000u);
-    EXPECT_STREQ(unknown.what(), "Unknown error");
-    EXPECT_EQ(unknown.GetOSErrorCode(), 1000u);
-
+    EXPECT_STREQ(WinError(2u).what(), std::strerror(ENOENT));
+    EXPECT_STREQ(WinError(1000u).what(), "Unknown error");
     EXPECT_STREQ(OSException().what(), "Unknown error");
     EXPECT_EQ(OSException().GetOSErrorCode(), 0u);
-    EXPECT_STREQ(WinError(String("custom text"), 5u).what(), "custom text");
-}
 
-TEST(Exception, WinErrorTakesTheThreadsLastError)
-{
     errno = EACCES;
     WinError denied;
     EXPECT_EQ(denied.GetOSErrorCode(), 5u);

@@ -46,18 +46,6 @@ private:
 
 } // namespace
 
-TEST_F(MachineIdentity, ConfiguredNameWinsOverTheHostName)
-{
-    Names().host = "box17";
-    EXPECT_EQ(GetLocalHostName(false).View(), u"box17");
-    SetMachineName(u"plant-a");
-    EXPECT_EQ(GetLocalHostName(false).View(), u"plant-a");
-    SetDomain(u"works.example");
-    EXPECT_EQ(GetLocalHostName(true).View(), u"plant-a.works.example");
-    SetMachineName(u"");
-    EXPECT_EQ(GetLocalHostName(false).View(), u""); // present, so used even when empty
-}
-
 TEST_F(MachineIdentity, DomainRules)
 {
     Names().domain = "resolver.example";
@@ -72,7 +60,7 @@ TEST_F(MachineIdentity, DomainRules)
     EXPECT_EQ(CompleteWithDomain(WString(u"h")).View(), u"h.store.example");
 }
 
-TEST_F(MachineIdentity, HostNameFallbacks)
+TEST_F(MachineIdentity, HostNameFallbacksAndTheConfiguredNameWins)
 {
     Names().host = "  box17 extra";
     Names().computer = "NODE";
@@ -87,6 +75,15 @@ TEST_F(MachineIdentity, HostNameFallbacks)
     EXPECT_EQ(GetLocalHostName(true).View(), u"localhost");
     Names().host = "   ";
     EXPECT_EQ(GetLocalHostName(false).View(), u"localhost");
+
+    // A configured name wins over the host name.
+    Names().host = "box17";
+    SetMachineName(u"plant-a");
+    EXPECT_EQ(GetLocalHostName(false).View(), u"plant-a");
+    SetDomain(u"works.example");
+    EXPECT_EQ(GetLocalHostName(true).View(), u"plant-a.works.example");
+    SetMachineName(u"");
+    EXPECT_EQ(GetLocalHostName(false).View(), u""); // present, so used even when empty
 }
 
 TEST_F(MachineIdentity, CachedNameIsComputedOnceForAllThreads)

@@ -58,10 +58,8 @@ const AcceptedRow kAccepted[] = {
     {"HostProcessTrailingBackslash", u"\\\\h\\p\\", UrlVerdict::NoPath, "1 [h] \\[p]", u"\\\\h\\p"},
     {"HostProcessPath", u"\\\\h\\p\\a.b", UrlVerdict::Path, "1 [h] \\[p] \\[a] .[b]", u"\\\\h\\p\\a.b"},
     {"LocalProcessPath", u"\\\\.\\p\\a", UrlVerdict::Path, "2 [p] \\[a]", u"\\\\.\\p\\a"},
-    {"DottedHostStaysUnquoted", u"\\\\plant.example.com\\p\\a", UrlVerdict::Path,
-     "1 [plant.example.com] \\[p] \\[a]", u"\\\\plant.example.com\\p\\a"},
-    {"CaseIsKept", u"\\\\LocalHost\\PROC\\Var", UrlVerdict::Path, "1 [LocalHost] \\[PROC] \\[Var]",
-     u"\\\\LocalHost\\PROC\\Var"},
+    {"DottedHostStaysUnquotedAndCaseIsKept", u"\\\\Plant.example.com\\PROC\\Var", UrlVerdict::Path,
+     "1 [Plant.example.com] \\[PROC] \\[Var]", u"\\\\Plant.example.com\\PROC\\Var"},
     {"QuotedProcessMayHoldFullStop", u"\\\\h\\'p.q'\\a", UrlVerdict::Path, "1 [h] \\[p.q] \\[a]",
      u"\\\\h\\'p.q'\\a"},
     {"QuotedProcessIsUnquotedWhenPrinted", u"\\\\h\\'pq'\\a", UrlVerdict::Path, "1 [h] \\[pq] \\[a]",
@@ -72,15 +70,12 @@ const AcceptedRow kAccepted[] = {
      u"\\\\h\\p\\a b/c\td"},
     {"QuotedBackslashAndLineEnds", u"'a\\b'.'c\r\nd'", UrlVerdict::Path, "4 [a\\b] .[c\\u000D\\u000Ad]",
      u"'a\\b'.'c\r\nd'"},
-    {"MixedSeparators", u"a.b\\c", UrlVerdict::Path, "4 [a] .[b] \\[c]", u"a.b\\c"},
     {"TrailingBackslashIsDropped", u"a\\b\\", UrlVerdict::Path, "4 [a] \\[b]", u"a\\b"},
     {"TrailingFullStopJoinsName", u"\\\\h\\p\\a.", UrlVerdict::Path, "1 [h] \\[p] \\[a.]", u"\\\\h\\p\\'a.'"},
     {"TrailingFullStopAfterQuotes", u"x.'a'.", UrlVerdict::Path, "4 [x] .[a.]", u"x.'a.'"},
-    {"ParentThenName", u"..\\a", UrlVerdict::Path, "4 .. \\[a]", u"..\\a"},
     {"ParentAlone", u"..\\", UrlVerdict::NoPath, "4 ..", u"..\\"},
     {"ParentChain", u"..\\..\\a.b", UrlVerdict::Path, "4 .. \\.. \\[a] .[b]", u"..\\..\\a.b"},
     {"RootParent", u"\\..\\a", UrlVerdict::Path, "3 .. \\[a]", u"\\..\\a"},
-    {"RootParentAlone", u"\\..\\", UrlVerdict::NoPath, "3 ..", u"\\..\\"},
     {"QuotedParentLookalike", u"'..'", UrlVerdict::Path, "4 [..]", u"'..'"},
     {"LocalQuotedFullStop", u"\\\\.\\'.'", UrlVerdict::NoPath, "2 [.]", u"\\\\.\\'.'"},
     {"NonAsciiAndSurrogates", u"\\\\h\\proze\u00DF\\\xD800.\uFFFF", UrlVerdict::Path,
@@ -123,23 +118,17 @@ const RejectedRow kRejected[] = {
     {"HostFollowedBySpace", u"\\\\h p\\q", UrlVerdict::MissingHostEnd},
     {"HostStartsWithApostrophe", u"\\\\'h'\\p", UrlVerdict::BadHostName},
     {"ProcessStartsWithBackslash", u"\\\\h\\\\p", UrlVerdict::DoubleSeparator},
-    {"ProcessStartsWithFullStop", u"\\\\h\\.p", UrlVerdict::DoubleSeparator},
     {"ProcessThenFullStop", u"\\\\h\\p.x", UrlVerdict::BadProcess},
-    {"SlashInProcess", u"\\\\h\\a/b\\x", UrlVerdict::BadProcess},
     {"QuotesDoNotProtectProcess", u"\\\\h\\'a/b'\\x", UrlVerdict::BadProcess},
     {"ParentAfterProcess", u"\\\\h\\p\\..\\a", UrlVerdict::DoubleSeparator},
     {"EmptyProcessBeforeLineFeed", u"\\\\h\\\nx", UrlVerdict::EmptySegment},
     {"TwoFullStops", u"a..b", UrlVerdict::DoubleSeparator},
-    {"FullStopBackslash", u"a.\\b", UrlVerdict::DoubleSeparator},
-    {"TwoBackslashes", u"a\\\\b", UrlVerdict::DoubleSeparator},
     {"LoneFullStop", u".", UrlVerdict::BadPath},
-    {"ParentWithoutBackslash", u"..x", UrlVerdict::BadPath},
     {"ParentAtEnd", u"..", UrlVerdict::BadPath},
     {"ParentThenTwoBackslashes", u"..\\\\a", UrlVerdict::DoubleSeparator},
     {"RootSingleFullStop", u"\\.a", UrlVerdict::BadPath},
     {"RootSecondParent", u"\\..\\..\\a", UrlVerdict::DoubleSeparator},
     {"LeftoverAfterQuotes", u"'a'b", UrlVerdict::BadPath},
-    {"CarriageReturnAfterName", u"a\r", UrlVerdict::BadPath},
     {"LineFeedAfterSeparator", u"a.\n", UrlVerdict::EmptySegment},
     {"UnclosedQuote", u"'abc", UrlVerdict::UnclosedQuote},
     {"DoubledApostropheAtEnd", u"'abc''", UrlVerdict::UnclosedQuote},
@@ -160,11 +149,6 @@ TEST_P(OrvekURLRejected, ThrowsSyntaxErrorNamingTheWholeText)
 
 INSTANTIATE_TEST_SUITE_P(Table, OrvekURLRejected, ::testing::ValuesIn(kRejected),
                          [](const auto& info) { return std::string(info.param.name); });
-
-TEST(OrvekURL, ErrorTextIsTheInputInTheLocaleCharset)
-{
-    EXPECT_EQ(ErrorText([] { OrvekURL url(u"\\\\h\\proze\u00DF.x"); }), "SyntaxError: \\\\h\\proze\xC3\x9F.x");
-}
 
 TEST(OrvekURL, NullIsTheEmptyTextAndEmbeddedNulIsRejected)
 {
@@ -208,12 +192,17 @@ TEST(OrvekURLSegment, ParentsHaveNoNameUntilOneIsSet)
     EXPECT_EQ(named.GetName().View(), u"keep");
 }
 
-TEST(OrvekURL, SegmentAccessIsBoundsChecked)
+TEST(OrvekURL, SegmentAccessIsBoundsCheckedAndCopiesAreIndependent)
 {
     OrvekURL url(u"\\\\h\\p");
     EXPECT_EQ(url.GetSegment(1).GetName().View(), u"p");
     EXPECT_THROW(url.GetSegment(2), OutOfRange);
     EXPECT_THROW(static_cast<const OrvekURL&>(url).GetSegment(2), OutOfRange);
+
+    OrvekURL copy(url);
+    copy.GetSegment(1).SetName(u"b");
+    copy.SetKind(OrvekURL::LocalForm);
+    EXPECT_EQ(Describe(url), "1 [h] \\[p]");
 }
 
 TEST(OrvekURL, KindZeroIsRefusedAndUnknownKindsPrintError)
@@ -226,33 +215,6 @@ TEST(OrvekURL, KindZeroIsRefusedAndUnknownKindsPrintError)
     EXPECT_EQ(Printable(url.ToString().View()), "h\\p");
     url.SetKind(5);
     EXPECT_EQ(Printable(url.ToString().View()), "ERROR");
-}
-
-TEST(OrvekURL, CopiesAreIndependent)
-{
-    OrvekURL original(u"\\\\h\\p\\a");
-    OrvekURL copy(original);
-    copy.GetSegment(2).SetName(u"b");
-    copy.SetKind(OrvekURL::LocalForm);
-    EXPECT_EQ(Describe(original), "1 [h] \\[p] \\[a]");
-}
-
-// The rewrites a subscribing client makes: a host replaced in place, and a
-// local-form URL turned into a host-form one.
-TEST(OrvekURL, HostCanBeRewritten)
-{
-    OrvekURL host(u"\\\\localhost\\p\\a");
-    host.GetSegment(0).SetName(u"plant7.example");
-    EXPECT_EQ(Printable(host.ToString().View()), "\\\\plant7.example\\p\\a");
-
-    OrvekURL local(u"\\\\.\\p\\a");
-    Vector<OrvekURL::Segment> segments;
-    segments.emplace_back(char16_t(0), WString(u"plant7"));
-    for (const OrvekURL::Segment& s : local.GetSegments())
-        segments.emplace_back(s.HasNoSeparator() ? u'\\' : s.GetSeparator(), s.GetName());
-    local.SetSegments(segments);
-    local.SetKind(OrvekURL::HostForm);
-    EXPECT_EQ(Printable(local.ToString().View()), "\\\\plant7\\p\\a");
 }
 
 } // namespace

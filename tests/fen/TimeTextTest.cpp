@@ -2,13 +2,12 @@
 #include "fen/osdep/TimeText.h"
 
 #include "ScopedPictureSource.h"
+#include "support/TemporaryHome.h"
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
-#include <memory>
 #include <ctime>
-#include <optional>
+#include <memory>
 #include <string>
 
 using namespace qv::fen;
@@ -38,31 +37,6 @@ std::u16string Text(const AbsTime& time, const char16_t* date, const char16_t* t
 {
     return std::u16string(AbsTimeToString(time, date, timeOfDay, digits, zone, false, nullptr, separator).View());
 }
-
-/// Sets TZ while it lives and restores it afterwards.
-class ScopedTimeZone {
-public:
-    explicit ScopedTimeZone(const char* zone)
-    {
-        if (const char* current = std::getenv("TZ"))
-            saved_ = current;
-        setenv("TZ", zone, 1);
-        tzset();
-    }
-    ~ScopedTimeZone()
-    {
-        if (saved_)
-            setenv("TZ", saved_->c_str(), 1);
-        else
-            unsetenv("TZ");
-        tzset();
-    }
-
-private:
-    std::optional<std::string> saved_;
-};
-
-constexpr const char* kCentralEurope = "CET-1CEST,M3.5.0,M10.5.0/3";
 
 class CommaPictures : public LocalePictureSource {
 public:
@@ -150,16 +124,21 @@ TEST(TimeText, TimesTheConversionsCannotShow)
 
 TEST(TimeText, LocalZonesUseTheOffsetOfTheInstant)
 {
-    ScopedTimeZone zone(kCentralEurope);
-    const AbsTime summer = Utc(2024, 6, 6, 12);
-    const AbsTime winter = Utc(2024, 1, 15, 12);
-    EXPECT_EQ(Text(summer, u"", u"%H:%M", 0, kShowLocalTime), u"14:00");
-    EXPECT_EQ(Text(summer, u"", u"%H:%M", 0, kShowFileTimeLocal), u"14:00");
-    EXPECT_EQ(Text(winter, u"", u"%H:%M", 0, kShowFileTimeLocal), u"13:00");
-    EXPECT_EQ(Text(winter, u"", u"%H:%M", 0, kShowUtc), u"12:00");
-    // Before 1970 and across midnight.
-    EXPECT_EQ(Text(Utc(1960, 12, 31, 23, 30), u"%Y-%m-%d", u"%H:%M", 0, kShowLocalTime), u"1961-01-01 00:30");
-    EXPECT_EQ(Text(Utc(1960, 12, 31, 23, 30), u"%Y-%m-%d", u"%H:%M", 0, kShowFileTimeLocal), u"1961-01-01 00:30");
+    {
+        qv::test::ScopedEnvironment zone("TZ", "CET-1CEST,M3.5.0,M10.5.0/3");
+        tzset();
+        const AbsTime summer = Utc(2024, 6, 6, 12);
+        const AbsTime winter = Utc(2024, 1, 15, 12);
+        EXPECT_EQ(Text(summer, u"", u"%H:%M", 0, kShowLocalTime), u"14:00");
+        EXPECT_EQ(Text(summer, u"", u"%H:%M", 0, kShowFileTimeLocal), u"14:00");
+        EXPECT_EQ(Text(winter, u"", u"%H:%M", 0, kShowFileTimeLocal), u"13:00");
+        EXPECT_EQ(Text(winter, u"", u"%H:%M", 0, kShowUtc), u"12:00");
+        // Before 1970 and across midnight.
+        const AbsTime eve = Utc(1960, 12, 31, 23, 30);
+        EXPECT_EQ(Text(eve, u"%Y-%m-%d", u"%H:%M", 0, kShowLocalTime), u"1961-01-01 00:30");
+        EXPECT_EQ(Text(eve, u"%Y-%m-%d", u"%H:%M", 0, kShowFileTimeLocal), u"1961-01-01 00:30");
+    }
+    tzset(); // the zone of the environment again
 }
 
 TEST(TimeText, LocaleFormatsAndSeparators)

@@ -116,12 +116,8 @@ void ExpectOnlyProtocolErrors(const std::vector<std::string>& seeds, unsigned se
 
 } // namespace
 
-TEST(ProtocolFuzz, ValueMessagesYieldOnlyProtocolErrors)
+TEST(ProtocolFuzz, DecodersYieldOnlyProtocolErrors)
 {
     ExpectOnlyProtocolErrors(kValueSeeds, 1);
-}
-
-TEST(ProtocolFuzz, OtherMessagesYieldOnlyProtocolErrors)
-{
     ExpectOnlyProtocolErrors(kOtherSeeds, 2);
 }

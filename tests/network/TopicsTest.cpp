@@ -8,7 +8,6 @@
 #include <gtest/gtest.h>
 
 #include <random>
-#include <set>
 #include <string>
 
 using namespace qv::network::protocol;
@@ -31,13 +30,12 @@ TEST(ProtocolTopic, EscapingExamples)
     EXPECT_EQ(UnescapeTopicLevel("%"), "");
 }
 
-TEST(ProtocolTopic, EscapingIsReversibleAndInjectiveOverGeneratedNames)
+TEST(ProtocolTopic, EscapingIsReversibleOverGeneratedNames)
 {
+    // Reversible, hence also injective: no two names share a level.
     std::mt19937 random(20240101);
     const char letters[] = "aZ09._~-/+#%' \\$\0\x7F\x80\xC3\xFF";
     const std::string alphabet(letters, sizeof letters - 1);
-    std::set<std::string> names;
-    std::set<std::string> levels;
     for (int i = 0; i < 20000; ++i) {
         std::string name;
         const int length = static_cast<int>(random() % 7);
@@ -48,10 +46,7 @@ TEST(ProtocolTopic, EscapingIsReversibleAndInjectiveOverGeneratedNames)
         ASSERT_EQ(level.find_first_of("/+#"), std::string::npos) << level;
         for (const char c : level)
             ASSERT_TRUE(c > 0x20 && c < 0x7F) << level;
-        names.insert(name);
-        levels.insert(level);
     }
-    EXPECT_EQ(names.size(), levels.size());
 }
 
 TEST(ProtocolTopic, UnescapeAcceptsOnlyTheEscapedForm)
@@ -107,18 +102,15 @@ TEST(ProtocolTopic, VariablePathIsThePrintedPathAfterTheProcess)
 
 TEST(ProtocolTopic, EquivalentUrlsShareOneTopic)
 {
-    const struct {
-        const char16_t* a;
-        const char16_t* b;
-    } same[] = {
+    const std::pair<const char16_t*, const char16_t*> same[] = {
         {u"\\\\h\\p\\drum.level", u"\\\\other\\p\\'drum'.'level'"},
         {u"\\\\h\\p\\drum.level", u"\\\\.\\p\\drum.level\\"},
         {u"\\\\h\\'p'\\x", u"\\\\h\\p\\x"},
         {u"\\\\h\\p\\'x''y.z'", u"\\\\H\\p\\'x''y.z'\\"},
         {u"\\\\h\\p\\a.", u"\\\\h\\p\\'a.'"},
     };
-    for (const auto& pair : same)
-        EXPECT_EQ(ValueTopic(Url(pair.a)), ValueTopic(Url(pair.b)));
+    for (const auto& [a, b] : same)
+        EXPECT_EQ(ValueTopic(Url(a)), ValueTopic(Url(b)));
     // The separators are part of the name: a.b and a\b are two variables.
     EXPECT_NE(ValueTopic(Url(u"\\\\h\\p\\a.b")), ValueTopic(Url(u"\\\\h\\p\\a\\b")));
     EXPECT_NE(ValueTopic(Url(u"\\\\h\\p\\a.b")), ValueTopic(Url(u"\\\\h\\p\\'a.b'")));
@@ -151,15 +143,12 @@ TEST(ProtocolText, Utf16AndUtf8)
 
 TEST(ProtocolText, Base64)
 {
-    const struct {
-        const char* bytes;
-        const char* text;
-    } vectors[] = {{"", ""},         {"f", "Zg=="},         {"fo", "Zm8="},        {"foo", "Zm9v"},
-                   {"foob", "Zm9vYg=="}, {"fooba", "Zm9vYmE="}, {"foobar", "Zm9vYmFy"}};
-    for (const auto& v : vectors) {
-        const std::string bytes(v.bytes);
-        EXPECT_EQ(Base64Encode(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size()), v.text);
-        const std::vector<std::uint8_t> decoded = Base64Decode(v.text);
+    const std::pair<std::string, std::string> vectors[] = {
+        {"", ""}, {"f", "Zg=="}, {"fo", "Zm8="}, {"foo", "Zm9v"}, {"foob", "Zm9vYg=="}, {"fooba", "Zm9vYmE="},
+        {"foobar", "Zm9vYmFy"}};
+    for (const auto& [bytes, text] : vectors) {
+        EXPECT_EQ(Base64Encode(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size()), text);
+        const std::vector<std::uint8_t> decoded = Base64Decode(text);
         EXPECT_EQ(std::string(decoded.begin(), decoded.end()), bytes);
     }
     for (const char* bad : {"Zg=", "Zh==", "Zm9=", "Z===", "====", "Zg==Zg==", "Zm 9v", "Zm9v\n"})

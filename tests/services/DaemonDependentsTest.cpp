@@ -36,10 +36,10 @@ TEST_F(DaemonDependentsTest, DependentsStartAfterAndStopBeforeTheirService)
 TEST_F(DaemonDependentsTest, StartingAServiceStartsWhatItDependsOnFirst)
 {
     DefineChain();
+    Define("Extra", "", {"Top"});
     StartDaemon(W("Top"), 0, nullptr, false);
     EXPECT_EQ(Recorded(), (Lines{"start Base", "start Middle", "start Top"}));
     // Without startDependents the dependents of a started service stay stopped.
-    Define("Extra", "", {"Top"});
     EXPECT_FALSE(IsDaemonRunning(W("Extra")));
 }
 

@@ -72,17 +72,11 @@ protected:
         const unsigned char connect[] = {0x10, 16,  0,   4,   'M', 'Q', 'T', 'T', 4,
                                          0x02, 0,   60,  0,   4,   'v', 'a', 'r', 'o'};
         std::vector<unsigned char> answer(4);
-        std::size_t got = 0;
-        if (::write(fd, connect, sizeof connect) == static_cast<ssize_t>(sizeof connect)) {
-            while (got < answer.size()) {
-                const ssize_t n = ::read(fd, answer.data() + got, answer.size() - got);
-                if (n <= 0)
-                    break;
-                got += static_cast<std::size_t>(n);
-            }
-        }
+        ssize_t got = 0;
+        if (::write(fd, connect, sizeof connect) == static_cast<ssize_t>(sizeof connect))
+            got = ::recv(fd, answer.data(), answer.size(), MSG_WAITALL);
         ::close(fd);
-        answer.resize(got);
+        answer.resize(got > 0 ? static_cast<std::size_t>(got) : 0);
         return answer;
     }
 

@@ -74,7 +74,7 @@ TEST_F(DaemonTest, ArgumentsOfTheStartReachTheService)
     EXPECT_EQ(Recorded(), std::vector<std::string>{"start Given"});
 }
 
-TEST_F(DaemonTest, StartWaitsWhileCheckpointsGrowAndGivesUpWhenTheyStall)
+TEST_F(DaemonTest, StartWaitsWhileCheckpointsGrowAndFailsWhenTheyStallOrTheServiceEnds)
 {
     // Eight checkpoints 300 ms apart outlast the 1000 ms wait hint many times over.
     Define("Slow", "--checkpoints 8 --every 300", {}, 1000);
@@ -89,10 +89,7 @@ TEST_F(DaemonTest, StartWaitsWhileCheckpointsGrowAndGivesUpWhenTheyStall)
     EXPECT_GE(Since(start), milliseconds(1000));
     EXPECT_LT(Since(start), milliseconds(5000));
     EXPECT_EQ(StatusOf("Stalled").state, kServiceStartPending);
-}
 
-TEST_F(DaemonTest, ServiceThatEndsDuringItsStartFails)
-{
     Define("Quitter", "--checkpoints 1 --then exit");
     ExpectServiceFailure([&] { StartDaemon(W("Quitter"), 0, nullptr, false); });
     EXPECT_TRUE(WaitUntil([&] { return !IsDaemonRunning(W("Quitter")); }, milliseconds(2000)));

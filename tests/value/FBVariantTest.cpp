@@ -217,7 +217,6 @@ TEST(FBVariant, WrittenValuesReadBack)
     const std::pair<VarData, VarData> rows[] = {
         {VarData::MakeTyped(TypeCode::Null), VarData::MakeTyped(TypeCode::Null)},
         {VarData::MakeLogical(true), VarData::MakeLogical(true)},
-        {Number(-32768, NumericKind::Int16), Number(-32768, NumericKind::Int16)},
         {Number(-2147483648.0, NumericKind::Int32), Number(-2147483648.0, NumericKind::Int32)},
         {Number(-0.1f, NumericKind::Float32), Number(-0.1f, NumericKind::Float32)},
         {VarData::MakeBitField(0xDEADBEEF), Number(0xDEADBEEF, NumericKind::UInt32)},
@@ -228,7 +227,6 @@ TEST(FBVariant, WrittenValuesReadBack)
         {VarData::MakeAnsi("a\0b", 3), VarData::MakeAnsi("a\0b", 3)},
         {VarData(u"wide"), VarData("wide")},
         {VarData(raw, 3), VarData("raw")},
-        {VarData(AbsTime{0x8000000000000001u, -2}), VarData(AbsTime{0x8000000000000001u, -2})},
         {VectorOf({VectorOf({"x", "yz"}), VectorOf({""})}), VectorOf({VectorOf({"x", "yz"}), VectorOf({""})})},
     };
     for (const auto& [written, expected] : rows) {
