@@ -43,6 +43,15 @@ ServiceStatus Query(const ServiceDefinition& service)
     return QueryServiceStatus(service.name, service.waitHint);
 }
 
+ServiceStatus QueryOrServiceFailure(const ServiceDefinition& service)
+{
+    try {
+        return Query(service);
+    } catch (const exception::Exception&) {
+        QV_DAEMON_THROW(exception::ServiceFailure());
+    }
+}
+
 std::chrono::milliseconds PollInterval(std::uint32_t waitHint)
 {
     return std::chrono::milliseconds(std::clamp<std::uint32_t>(waitHint / 10, 1000, 10000));

@@ -29,6 +29,9 @@ ServiceDefinition OpenService(const WString& name);
 /// The current status of a defined service; WinError on failure.
 ServiceStatus Query(const ServiceDefinition& service);
 
+/// As Query, but any failure is ServiceFailure.
+ServiceStatus QueryOrServiceFailure(const ServiceDefinition& service);
+
 /// Wait hint / 10, clamped to 1000..10000 ms.
 std::chrono::milliseconds PollInterval(std::uint32_t waitHint);
 

@@ -161,12 +161,7 @@ void StartDaemon(const WString& name, std::uint32_t argc, const char16_t* const*
     NestingGuard nesting;
     const ServiceDefinition service = OpenService(name);
 
-    ServiceStatus status;
-    try {
-        status = Query(service);
-    } catch (const exception::Exception&) {
-        QV_DAEMON_THROW(exception::ServiceFailure());
-    }
+    ServiceStatus status = QueryOrServiceFailure(service);
     if (status.state != kServiceStopped && status.state != kServiceStopPending)
         return;
     if (status.state == kServiceStopPending)
@@ -178,11 +173,7 @@ void StartDaemon(const WString& name, std::uint32_t argc, const char16_t* const*
             arguments.push_back(ToAnsi(WString(argv[i])).c_str());
     LaunchService(service, arguments);
 
-    try {
-        status = Query(service);
-    } catch (const exception::Exception&) {
-        QV_DAEMON_THROW(exception::ServiceFailure());
-    }
+    status = QueryOrServiceFailure(service);
     auto noted = Clock::now();
     std::uint32_t checkpoint = status.checkpoint;
     while (status.state == kServiceStartPending) {

@@ -61,12 +61,7 @@ void StopDaemon(const WString& name, bool killOnTimeout, std::uint32_t timeoutMs
     const std::uint32_t effectiveTimeout = timeoutMs != 0 ? timeoutMs : 30000;
     NestingGuard nesting;
     const ServiceDefinition service = OpenService(name);
-    ServiceStatus status;
-    try {
-        status = Query(service);
-    } catch (const exception::Exception&) {
-        QV_DAEMON_THROW(exception::ServiceFailure());
-    }
+    ServiceStatus status = QueryOrServiceFailure(service);
     if (status.state == kServiceStopped)
         return;
     int processId = status.processId;
